@@ -1,0 +1,218 @@
+// Name tables of opcodes, device event bits and session events, for log messages.
+#include <cstddef>
+#include <cstdint>
+
+#include "zal-ipod-2/common.h"
+#include "zal-ipod-2/opcodes.h"
+
+namespace {
+
+constexpr const char *kNone = "None";
+
+// Index = opcode. The first entry keeps its historical text, blanks included.
+constexpr const char *kOpcodeNames[] = {
+    "HELLO =  0",
+    "KEEP_ALIVE",
+    "EVENT",
+    "RETURN",
+    "ERROR",
+    "OPEN_SESSION",
+    "CLOSE_SESSION",
+    "LINGO_OPTIONS",
+    "PLAY",
+    "PLAY_CURRENT_SELECTION",
+    "PLAYPAUSE",
+    "STOP",
+    "PAUSE",
+    "NEXT_TRACK",
+    "PREV_TRACK",
+    "MUTE",
+    "VOLUME_INC",
+    "VOLUME_DEC",
+    "PLAYITEMS",
+    "PLAYCOLLECTION",
+    "SET_UPDATE_ITEMS",
+    "MEDIA_LIB_UID",
+    "START_LIB_UPDATE",
+    "STOP_LIB_UPDATE",
+    "START_DEV_AUDIO_ROUTE",
+    "STOP_DEV_AUDIO_ROUTE",
+    "RESUME_LIB_UPDATE",
+    "TRACKING_DEC",
+    "TRACKING_INC",
+    "TRACKING_NORMAL",
+    "START_FFW",
+    "START_REW",
+    "STOP_FFWREW",
+    "VOICE_COMMAND",
+    "PROMOTE",
+    "DEMOTE",
+    "ADD_TO_CART",
+    "SET_POSITION",
+    "SET_TRACK",
+    "CURRENT_TRACK_INFO",
+    "CURRENT_TRACK_SAMPLE_RATE",
+    "CURRENT_TRACK_IS_AUDIOBOOK",
+    "CURRENT_TRACK_CONTAINS_VIDEO",
+    "CURRENT_TRACK_ARTWORK",
+    "CURRENT_TRACK_POS_ARTWORK",
+    "CURRENT_TRACK_ARTWORK_TIMES",
+    "GET_PLAY_STATE",
+    "GET_CURRENT_DRAW",
+    "GET_IF_CHARGE",
+    "POWER_SOURCE_UPDATE",
+    "GET_CURRENT_TRACK_INDEX",
+    "SET_SHUFFLE",
+    "GET_SHUFFLE",
+    "SET_REPEAT",
+    "GET_REPEAT",
+    "SET_CATEGORY",
+    "SET_HIERARCHY",
+    "SELECT_DB",
+    "GET_DB_RECORDS",
+    "REAUTHENTICATION",
+    "SET_PREFERENCE",
+    "GET_PREFERENCE",
+    "HEALTH_EXAMINE",
+    "WRITE_TAG",
+    "SET_STATECHANGE",
+    "ENTER_VIDEOOUTMODE",
+    "EXIT_VIDEOOUTMODE",
+    "GET_VIDEOOUTOPTIONS",
+    "SET_VIDEOOUTOPTIONS",
+    "NAVIGATE_VIDEOOUT",
+    "GET_MODE",
+    "GET_COLOR_DISPLAY_IMAGE_LIMITS",
+    "LAUNCHAPPLICATION",
+    "SIMPLE_CONTEXTBUTTON",
+    "SIMPLE_VIDEOBUTTON",
+    "SIMPLE_AUDIOBUTTON",
+    "SIMPLE_RADIOBUTTON",
+    "SIMPLE_CAMERABUTTON",
+    "INDEXED_TRACK_INFO",
+    "GET_DB_ITUNES_INFO",
+    "GET_DB_TRACK_INFO",
+    "GET_PB_TRACK_INFO",
+    "PREPARE_UID_LIST",
+    "PLAY_UID_LIST",
+    "REQUEST_LINGO_VERSION",
+    "SET_VIDEO_DELAY",
+    "SET_AVAILABLE_CURRENT",
+    "SET_INTERNAL_BATTERY_CHARGING_STATE",
+    "ROTAION_IPNUT",
+    "LOCALIZATION_INFO",
+    "REQUEST_WIFI_CONNECTION_INFO",
+    "VOICEOVER_EVENT",
+    "GET_VOICEOVER_PARAMETER",
+    "SET_VOICEOVER_PARAMETER",
+    "GET_CURRENT_VOICEOVER_ITEMPROPERTY",
+    "SET_VOICEOVER_CONTEXT",
+    "REGISTER_DESCRIPTOR",
+    "IPOD_HID_REPORT",
+    "UNREGISTER_DESCRIPTOR",
+    "CREATE_GENIUS_PLAYLIST",
+    "REFRESH_GENIUS_PLAYLIST",
+    "IS_GENIUS_AVAILABLEFORTRACK",
+    "GET_PLAYLIST_INFO",
+    "SET_BT_COMPONENT_STATE",
+    "START_BT_UPDATES",
+    "STOP_BT_UPDATES",
+    "GET_BT_CONNECTION_STATUS",
+    "SEND_EAP_DATAGRAM",
+    "SEND_LOCATION_INFO",
+    "GET_ITEMS_CURRENT_CATEGORY",
+    "COUNT_ITEMS_CURRENT_CATEGORY",
+    "GET_ITEMS_IDENTIFIER_CURRENT_FILTER",
+    "COUNT_ITEMS_IDENTIFIER_CURRENT_FILTER",
+    "GET_CURRENT_EQPROFILE_INDEX",
+    "SET_CURRENT_EQPROFILE_INDEX",
+    "GET_NUM_EQPROFILES",
+    "GET_INDEXED_EQPROFILE_NAME",
+    "GET_POWER_BATTERY_STATE",
+    "GET_SOUND_CHECK_STATE",
+    "SET_SOUND_CHECK_STATE",
+    "START_TELEPHONY_CALLSTATE_INFORMATION",
+    "STOP_TELEPHONY_CALLSTATE_INFORMATION",
+    "SEND_VEHICLE_STATUS_UPDATE",
+    "START_TELEPHONY_UPDATE",
+    "STOP_TELEPHONY_UPDATE",
+    "GET_CURRENT_PLAYING_TRACK_CHAPTER_INDEX",
+    "GET_CURRENT_PLAYING_TRACK_CHAPTER_COUNT",
+    "SET_CURRENT_PLAYING_TRACK_CHAPTER",
+    "GET_CURRENT_PLAYING_TRACK_CHAPTER_PLAY_STATUS",
+    "GET_TRACK_ARTWORK_BY_UID",
+    "GET_COLLECTION_ID",
+    "SET_CONFIG",
+    "GET_CONFIG",
+};
+static_assert(sizeof(kOpcodeNames) / sizeof(kOpcodeNames[0]) == ZAL_OP_NAMED_COUNT);
+
+// Entry k names bit k of a device event mask. The event kinds are one higher up to the
+// audiobook flag; the video flag has a bit but no kind of its own, so from there on the
+// entry equals the kind. The last two have no bit and are never looked up by mask.
+constexpr const char *kDeviceEventNames[] = {
+    "ZALIPOD_EVENT_CONNECTED",
+    "ZALIPOD_EVENT_DISCONNECTED",
+    "ZALIPOD_EVENT_DETECTION_FAILED",
+    "ZALIPOD_EVENT_AUTHENTICATED",
+    "ZALIPOD_EVENT_MODE_CHANGED",
+    "ZALIPOD_EVENT_PLAYSTATE_CHANGED",
+    "ZALIPOD_EVENT_TRACK_CHANGED",
+    "ZALIPOD_EVENT_TRACKINFO_RETRIEVED",
+    "ZALIPOD_EVENT_SAMPLERATE_RETRIEVED",
+    "ZALIPOD_EVENT_TRACK_POSITION_CHANGED",
+    "ZALIPOD_EVENT_CHAPTER_CHANGED",
+    "ZALIPOD_EVENT_INITSTATE",
+    "ZALIPOD_EVENT_IAP2_INUSE",
+    "ZALIPOD_EVENT_MEDIALIBRARYUPDATE",
+    "ZALIPOD_EVENT_MEDIA_CHANGED",
+    "ZALIPOD_EVENT_ARTWORK_TRANSFER_DONE",
+    "ZALIPOD_EVENT_BT_CONNECTION_UPDATE",
+    "ZALIPOD_EVENT_EAP_DATAGRAM",
+    "ZALIPOD_EVENT_LOCATION_INFORMATION",
+    "ZALIPOD_EVENT_PLAYING_APP",
+    "ZALIPOD_EVENT_TELEPHONY_CALLSTATE_INFORMATION",
+    "ZALIPOD_EVENT_VEHICLE_STATUS_UPDATE",
+    "ZALIPOD_EVENT_WIFI_INFORMATION",
+    "ZALIPOD_EVENT_TELEPHONY_UPDATE",
+    "ZALIPOD_EVENT_TRACK_IS_AUDIOBOOK",
+    "ZALIPOD_EVENT_TRACK_CONTAINS_VIDEO",
+    "ZALIPOD_EVENT_SHUFFLE_MODE_CHANGED",
+    "ZALIPOD_EVENT_REPEAT_MODE_CHANGED",
+    "ZALIPOD_EVENT_DISCONNECTED_HOSTMODE",
+    "ZALIPOD_EVENT_ROLE_SWITCHED",
+    "ZALIPOD_EVENT_TELEPHONY_VCARD_INFORMATION",
+    "ZALIPOD_EVENT_DEVICE_NAME",
+    "ZALIPOD_EVENT_WIRELESS_CARPLAY_UPDATE",
+    "ZALIPOD_EVENT_UNKNOWN",
+};
+static_assert(sizeof(kDeviceEventNames) / sizeof(kDeviceEventNames[0]) == 34);
+
+constexpr const char *kSessionEventNames[] = {
+    "DEVICE_ADDED", "DEVICE_REMOVED", "SESSION_OPENED", "PLAYED", "STOPPED", "PAUSED",
+};
+
+template <std::size_t N>
+const char *name_at(const char *const (&table)[N], uint32_t index) {
+    return index < N ? table[index] : kNone;
+}
+
+}  // namespace
+
+extern "C" {
+
+ZAL_API const char *get_function_string(uint32_t opcode) {
+    return name_at(kOpcodeNames, opcode);
+}
+
+ZAL_API const char *get_event_string(uint32_t index) {
+    return name_at(kSessionEventNames, index);
+}
+
+// Only a mask with exactly one bit set has a name.
+ZAL_API const char *get_device_event_string(uint32_t mask) {
+    if (mask == 0 || (mask & (mask - 1)) != 0) return kNone;
+    return name_at(kDeviceEventNames, static_cast<uint32_t>(__builtin_ctz(mask)));
+}
+
+}  // extern "C"

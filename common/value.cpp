@@ -1,0 +1,404 @@
+// The value tree: constructors, accessors, arrays, hashes and the deep free.
+//
+// Scalars and blobs live in one heap block (record, payload, NUL). Containers are a
+// record plus a body whose pointer arrays start at capacity 8 and double when full.
+// Accessors tolerate a null value or one of another kind by returning a neutral result
+// (0, NULL, -1) and changing nothing; the wire decoder never produces such calls, but
+// application code handed a reply it did not expect must not crash on it.
+#include <climits>
+#include <cstdint>
+#include <cstdlib>
+#include <cstring>
+
+#include "common/log.h"
+#include "common/value_internal.h"
+
+namespace {
+
+constexpr int32_t kDefaultCapacity = 8;
+
+bool is_kind(const gval *v, uint32_t kind) {
+    return v != nullptr && v->type == kind;
+}
+
+gval *new_container(uint32_t kind, void *body) {
+    if (body == nullptr) return nullptr;
+    auto *v = static_cast<gval *>(std::malloc(sizeof(gval)));
+    if (v == nullptr) return nullptr;
+    v->type = kind;
+    v->data = body;
+    v->len = 0;
+    return v;
+}
+
+// Grows a pointer array to new_capacity slots; false (array unchanged) on failure.
+template <class T>
+bool grow(T **slots, int32_t new_capacity) {
+    void *p = std::realloc(*slots, sizeof(T) * static_cast<std::size_t>(new_capacity));
+    if (p == nullptr) return false;
+    *slots = static_cast<T *>(p);
+    return true;
+}
+
+// Capacity after doubling; a zero capacity starts again at the default.
+int32_t doubled(int32_t capacity) {
+    if (capacity <= 0) return kDefaultCapacity;
+    if (capacity > INT32_MAX / 2) return -1;
+    return capacity * 2;
+}
+
+bool hash_make_room(gval_hash *body) {
+    if (body->count < body->capacity) return true;
+    int32_t cap = doubled(body->count);
+    if (cap < 0) return false;
+    if (!grow(&body->keys, cap) || !grow(&body->values, cap)) return false;
+    body->capacity = cap;
+    return true;
+}
+
+}  // namespace
+
+gval *value_new_blob(uint32_t kind, const void *p, uint32_t n) {
+    if (n > 0 && p == nullptr) return nullptr;
+    if (static_cast<std::uint64_t>(n) + sizeof(gval) + 1 > SIZE_MAX) return nullptr;
+    auto *v = static_cast<gval *>(std::malloc(sizeof(gval) + static_cast<std::size_t>(n) + 1));
+    if (v == nullptr) return nullptr;
+    auto *payload = reinterpret_cast<unsigned char *>(v + 1);
+    v->type = kind;
+    v->data = payload;
+    v->len = n;
+    if (n > 0) std::memcpy(payload, p, n);
+    payload[n] = '\0';  // also for bytes: a stray read as text stops here
+    return v;
+}
+
+int value_hash_append_owned(gval *h, char *key, gval *value) {
+    gval_hash *body = value_hash_body(h);
+    if (key == nullptr || !hash_make_room(body)) {
+        std::free(key);
+        serialize_free(value);
+        return -1;
+    }
+    body->keys[body->count] = key;
+    body->values[body->count] = value;
+    return body->count++;
+}
+
+int value_hash_append(gval *h, const char *key, gval *value) {
+    return value_hash_append_owned(h, strdup(key), value);
+}
+
+// Capacity that doubling from the default reaches for n items; -1 when out of range.
+static int32_t grown_capacity(int32_t capacity, uint32_t n) {
+    int32_t cap = capacity > 0 ? capacity : kDefaultCapacity;
+    while (static_cast<uint32_t>(cap) < n) {
+        cap = doubled(cap);
+        if (cap < 0) return -1;
+    }
+    return cap;
+}
+
+bool value_array_presize(gval *a, uint32_t n) {
+    gval_array *body = value_array_body(a);
+    if (n <= static_cast<uint32_t>(body->capacity)) return true;
+    int32_t cap = grown_capacity(body->capacity, n);
+    if (cap < 0 || !grow(&body->items, cap)) return false;
+    body->capacity = cap;
+    return true;
+}
+
+bool value_hash_presize(gval *h, uint32_t n) {
+    gval_hash *body = value_hash_body(h);
+    if (n <= static_cast<uint32_t>(body->capacity)) return true;
+    int32_t cap = grown_capacity(body->capacity, n);
+    if (cap < 0 || !grow(&body->keys, cap) || !grow(&body->values, cap)) return false;
+    body->capacity = cap;
+    return true;
+}
+
+void value_hash_replace(gval *h, int32_t i, gval *value) {
+    gval_hash *body = value_hash_body(h);
+    serialize_free(body->values[i]);
+    body->values[i] = value;
+}
+
+extern "C" {
+
+ZAL_API gval *serialize_int(int32_t v) {
+    return value_new_blob(SERIALIZE_INT, &v, 4);
+}
+
+ZAL_API gval *serialize_float(float v) {
+    static_assert(sizeof(float) == 4, "floats travel as 32 bits");
+    return value_new_blob(SERIALIZE_FLOAT, &v, 4);
+}
+
+ZAL_API gval *serialize_string(const char *s) {
+    if (s == nullptr) s = "";
+    std::size_t n = std::strlen(s);
+    if (n > UINT32_MAX) return nullptr;
+    return value_new_blob(SERIALIZE_STRING, s, static_cast<uint32_t>(n));
+}
+
+ZAL_API gval *serialize_bytes(const void *p, uint32_t n) {
+    return value_new_blob(SERIALIZE_BYTES, p, n);
+}
+
+ZAL_API gval *serialize_struct(const void *p, uint32_t n) {
+    return value_new_blob(SERIALIZE_STRUCT, p, n);
+}
+
+ZAL_API gval_array *serialize_array_new_reserve(uint32_t n) {
+    if (n > INT32_MAX) return nullptr;
+    auto *body = static_cast<gval_array *>(std::calloc(1, sizeof(gval_array)));
+    if (body == nullptr) return nullptr;
+    if (n > 0) {
+        body->items = static_cast<gval **>(std::malloc(sizeof(gval *) * n));
+        if (body->items == nullptr) {
+            std::free(body);
+            return nullptr;
+        }
+    }
+    body->capacity = static_cast<int32_t>(n);
+    return body;
+}
+
+ZAL_API gval_array *serialize_array_new(void) {
+    return serialize_array_new_reserve(kDefaultCapacity);
+}
+
+ZAL_API gval_hash *serialize_hash_new_reserve(uint32_t n) {
+    if (n > INT32_MAX) return nullptr;
+    auto *body = static_cast<gval_hash *>(std::calloc(1, sizeof(gval_hash)));
+    if (body == nullptr) return nullptr;
+    if (n > 0) {
+        body->keys = static_cast<char **>(std::malloc(sizeof(char *) * n));
+        body->values = static_cast<gval **>(std::malloc(sizeof(gval *) * n));
+        if (body->keys == nullptr || body->values == nullptr) {
+            std::free(body->keys);
+            std::free(body->values);
+            std::free(body);
+            return nullptr;
+        }
+    }
+    body->capacity = static_cast<int32_t>(n);
+    return body;
+}
+
+ZAL_API gval_hash *serialize_hash_new(void) {
+    return serialize_hash_new_reserve(kDefaultCapacity);
+}
+
+ZAL_API gval *serialize_array_reserve(uint32_t n) {
+    gval_array *body = serialize_array_new_reserve(n);
+    gval *v = new_container(SERIALIZE_ARRAY, body);
+    if (v == nullptr && body != nullptr) {
+        std::free(body->items);
+        std::free(body);
+    }
+    return v;
+}
+
+ZAL_API gval *serialize_array(void) {
+    return serialize_array_reserve(kDefaultCapacity);
+}
+
+ZAL_API gval *serialize_hash(void) {
+    gval_hash *body = serialize_hash_new();
+    gval *v = new_container(SERIALIZE_HASH, body);
+    if (v == nullptr && body != nullptr) {
+        std::free(body->keys);
+        std::free(body->values);
+        std::free(body);
+    }
+    return v;
+}
+
+ZAL_API int serialize_type(const gval *v) {
+    if (v == nullptr) {
+        ZAL_LOGD("%s: gval is NULL!", "serialize_type");
+        return SERIALIZE_NONE;
+    }
+    return static_cast<int>(v->type);
+}
+
+ZAL_API int32_t serialize_get_int(const gval *v) {
+    int32_t out = 0;
+    if (v != nullptr && v->data != nullptr) std::memcpy(&out, v->data, sizeof out);
+    return out;
+}
+
+ZAL_API float serialize_get_float(const gval *v) {
+    float out = 0.0f;
+    if (v != nullptr && v->data != nullptr) std::memcpy(&out, v->data, sizeof out);
+    return out;
+}
+
+ZAL_API const char *serialize_get_string(const gval *v) {
+    return v != nullptr ? static_cast<const char *>(v->data) : nullptr;
+}
+
+ZAL_API const void *serialize_get_struct(const gval *v) {
+    return v != nullptr ? v->data : nullptr;
+}
+
+ZAL_API uint32_t serialize_get_struct_length(const gval *v) {
+    return v != nullptr ? v->len : 0;
+}
+
+ZAL_API const void *serialize_get_bytes(const gval *v, uint32_t *len) {
+    if (len != nullptr) *len = v != nullptr ? v->len : 0;
+    return v != nullptr ? v->data : nullptr;
+}
+
+ZAL_API int serialize_array_count(const gval *a) {
+    return is_kind(a, SERIALIZE_ARRAY) ? value_array_body(a)->count : 0;
+}
+
+ZAL_API gval *serialize_array_get(const gval *a, uint32_t i) {
+    if (!is_kind(a, SERIALIZE_ARRAY)) return nullptr;
+    gval_array *body = value_array_body(a);
+    return i < static_cast<uint32_t>(body->count) ? body->items[i] : nullptr;
+}
+
+ZAL_API void serialize_array_resize(gval *a, int32_t n) {
+    if (!is_kind(a, SERIALIZE_ARRAY)) return;
+    gval_array *body = value_array_body(a);
+    if (n > body->capacity && grow(&body->items, n)) body->capacity = n;
+}
+
+// Makes room for one more item; false when the array cannot grow.
+static bool array_make_room(gval *a) {
+    gval_array *body = value_array_body(a);
+    if (body->count < body->capacity) return true;
+    int32_t cap = doubled(body->capacity);
+    if (cap < 0) return false;
+    serialize_array_resize(a, cap);
+    return body->count < body->capacity;
+}
+
+ZAL_API int serialize_array_add(gval *a, gval *item) {
+    if (item == nullptr) return -1;
+    if (!is_kind(a, SERIALIZE_ARRAY) || !array_make_room(a)) {
+        serialize_free(item);
+        return -1;
+    }
+    gval_array *body = value_array_body(a);
+    body->items[body->count++] = item;
+    return 0;
+}
+
+ZAL_API void serialize_array_insert(gval *a, uint32_t i, gval *item) {
+    if (item == nullptr || !is_kind(a, SERIALIZE_ARRAY)) return;
+    gval_array *body = value_array_body(a);
+    if (i >= static_cast<uint32_t>(body->count)) return;
+    if (!array_make_room(a)) {
+        serialize_free(item);
+        return;
+    }
+    std::memmove(&body->items[i + 1], &body->items[i],
+                 sizeof(gval *) * (static_cast<uint32_t>(body->count) - i));
+    body->items[i] = item;
+    body->count++;
+}
+
+ZAL_API void serialize_array_set(gval *a, uint32_t i, gval *item) {
+    if (item == nullptr || !is_kind(a, SERIALIZE_ARRAY)) return;
+    gval_array *body = value_array_body(a);
+    if (i >= static_cast<uint32_t>(body->count)) return;
+    serialize_free(body->items[i]);
+    body->items[i] = item;
+}
+
+ZAL_API void serialize_array_del(gval *a, uint32_t i) {
+    if (!is_kind(a, SERIALIZE_ARRAY)) return;
+    gval_array *body = value_array_body(a);
+    if (i >= static_cast<uint32_t>(body->count)) return;
+    serialize_free(body->items[i]);
+    std::memmove(&body->items[i], &body->items[i + 1],
+                 sizeof(gval *) * (static_cast<uint32_t>(body->count) - i - 1));
+    body->count--;
+}
+
+ZAL_API void serialize_array_destroy(gval *a) {
+    if (!is_kind(a, SERIALIZE_ARRAY) || a->data == nullptr) return;
+    gval_array *body = value_array_body(a);
+    for (int32_t i = 0; i < body->count; ++i) serialize_free(body->items[i]);
+    std::free(body->items);
+    std::free(body);
+    a->data = nullptr;
+}
+
+ZAL_API int serialize_hash_count(const gval *h) {
+    return is_kind(h, SERIALIZE_HASH) ? value_hash_body(h)->count : 0;
+}
+
+ZAL_API gval *serialize_hash_get(const gval *h, const char *key) {
+    if (!is_kind(h, SERIALIZE_HASH) || key == nullptr) return nullptr;
+    gval_hash *body = value_hash_body(h);
+    for (int32_t i = 0; i < body->count; ++i)
+        if (std::strcmp(body->keys[i], key) == 0) return body->values[i];
+    return nullptr;
+}
+
+ZAL_API const char *serialize_hash_get_key(const gval *h, int32_t i) {
+    if (!is_kind(h, SERIALIZE_HASH)) return nullptr;
+    gval_hash *body = value_hash_body(h);
+    return i >= 0 && i < body->count ? body->keys[i] : nullptr;
+}
+
+ZAL_API int serialize_hash_add(gval *h, const char *key, gval *value) {
+    if (key == nullptr || value == nullptr) return -1;
+    if (!is_kind(h, SERIALIZE_HASH)) {
+        serialize_free(value);
+        return -1;
+    }
+    gval_hash *body = value_hash_body(h);
+    for (int32_t i = 0; i < body->count; ++i) {
+        if (std::strcmp(body->keys[i], key) == 0) {
+            value_hash_replace(h, i, value);
+            return 0;
+        }
+    }
+    return value_hash_append(h, key, value) < 0 ? -1 : 0;
+}
+
+ZAL_API void serialize_hash_destroy(gval *h) {
+    if (!is_kind(h, SERIALIZE_HASH) || h->data == nullptr) return;
+    gval_hash *body = value_hash_body(h);
+    for (int32_t i = 0; i < body->count; ++i) {
+        std::free(body->keys[i]);
+        serialize_free(body->values[i]);
+    }
+    std::free(body->keys);
+    std::free(body->values);
+    std::free(body);
+    h->data = nullptr;
+}
+
+ZAL_API void serialize_free(gval *v) {
+    switch (serialize_type(v)) {
+        case SERIALIZE_NONE:
+            return;
+        case SERIALIZE_ARRAY:
+            serialize_array_destroy(v);
+            break;
+        case SERIALIZE_HASH:
+            serialize_hash_destroy(v);
+            break;
+        default:
+            break;
+    }
+    std::free(v);
+}
+
+ZAL_API gval *serialize_dup(const gval *v) {
+    uint32_t len = 0;
+    unsigned char *buf = serialize(v, &len);
+    if (buf == nullptr) return nullptr;
+    gval *copy = unserialize(buf, len);
+    std::free(buf);
+    return copy;
+}
+
+}  // extern "C"

@@ -1,0 +1,18 @@
+// Cached state of the command families that do not have a header of their own yet.
+// A family moves its struct into its own header when it grows; each struct releases what
+// it owns in its destructor (the handle is destroyed by zal_ipod_close) and has a reset
+// that the playback cache reset calls.
+#pragma once
+
+#include <cstdint>
+
+// iAP1 database browsing: record counts and results of the last category requests.
+struct zal_records_state {
+    int32_t record_count = 0;
+    void reset() {}
+};
+
+// Artwork of the current track (buffer, mapped file, geometry).
+struct zal_artwork_state {
+    void reset() {}
+};

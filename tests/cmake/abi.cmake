@@ -1,0 +1,7 @@
+# The ABI test inspects the built shared library: where it is and how to list its symbols.
+find_program(ZAL_NM_PROGRAM NAMES nm REQUIRED)
+target_compile_definitions(abi_test PRIVATE
+    ZAL_SHARED_LIBRARY_PATH="$<TARGET_FILE:zal-ipod-2>"
+    ZAL_NM_PROGRAM="${ZAL_NM_PROGRAM}")
+target_link_libraries(abi_test PRIVATE ${CMAKE_DL_LIBS})
+add_dependencies(abi_test zal-ipod-2)

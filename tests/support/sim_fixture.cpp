@@ -1,0 +1,60 @@
+// The zald-sim suites' fixture.
+#include "sim_fixture.h"
+
+namespace zaltest {
+
+Value int_value(int32_t v) {
+    return Value(serialize_int(v));
+}
+
+Value string_array(const std::vector<std::string> &items) {
+    Value array(serialize_array());
+    for (const auto &item : items) serialize_array_add(array.get(), serialize_string(item.c_str()));
+    return array;
+}
+
+std::string string_at(const RawPacket &packet, const char *key) {
+    Value v = packet.value();
+    if (!v || serialize_type(v.get()) != SERIALIZE_HASH) return "";
+    gval *item = serialize_hash_get(v.get(), key);
+    return item && serialize_type(item) == SERIALIZE_STRING ? serialize_get_string(item) : "";
+}
+
+void SimTest::start(const std::vector<std::string> &args) {
+    ASSERT_TRUE(sim->start_listening(args)) << "zald-sim did not start:\n"
+                                            << sim->output() << sim->errors();
+    client = connect();
+    ASSERT_NE(client, nullptr);
+}
+
+std::unique_ptr<RawClient> SimTest::connect() {
+    auto c = std::make_unique<RawClient>();
+    if (!c->connect_abstract(sim->socket_name())) return nullptr;
+    return c;
+}
+
+void SimTest::open_session(RawClient &c, int32_t index) {
+    auto reply = c.call(kOpOpenSession, int_value(index).get());
+    ASSERT_TRUE(reply.has_value());
+    ASSERT_EQ(reply->opcode, kOpReturn);
+    ASSERT_EQ(reply->int_at("result"), 1);
+}
+
+}  // namespace zaltest
+
+#include <unistd.h>
+
+#include <fstream>
+
+namespace zaltest {
+
+ScenarioFile::ScenarioFile(const std::string &json)
+    : path_("/tmp/" + SimProcess::unique_name("scenario") + ".json") {
+    std::ofstream(path_) << json;
+}
+
+ScenarioFile::~ScenarioFile() {
+    unlink(path_.c_str());
+}
+
+}  // namespace zaltest
