@@ -326,6 +326,38 @@ ZAL_API uint16_t zal_ipod_get_config(zal_ipod_handle *h, const char *key);
  * else the daemon's error code, else -2 (no reply or neither in it; out untouched). */
 ZAL_API int zal_ipod_get_config_sync(zal_ipod_handle *h, const char *key, char *out);
 
+/* ---- Now playing -------------------------------------------------------------------------
+ * Playback state, the current-track cache and artwork.
+ * ---------------------------------------------------------------------------------- */
+
+/* ---- Accessory input and video out -------------------------------------------------------
+ * Buttons, rotation, HID, VoiceOver and video-out settings.
+ * ---------------------------------------------------------------------------------- */
+
+/* ---- Device information ------------------------------------------------------------------
+ * Lingo versions and options, localization, equaliser, battery and power.
+ * ---------------------------------------------------------------------------------- */
+
+/* ---- Communications and vehicle integration ----------------------------------------------
+ * Telephony, external accessory datagrams, location, vehicle status and Wi-Fi.
+ * ---------------------------------------------------------------------------------- */
+
+/* ---- iAP1 database browsing --------------------------------------------------------------
+ * Categories, records and track records of older devices.
+ * ---------------------------------------------------------------------------------- */
+
+/* ---- Library updates and play lists ------------------------------------------------------
+ * Library update items, collections, play lists, Genius and play items.
+ * ---------------------------------------------------------------------------------- */
+
+/* ---- Media browser -----------------------------------------------------------------------
+ * Categories, filtered queries, the selection stack and playing a selection.
+ * ---------------------------------------------------------------------------------- */
+
+/* ---- Connection state --------------------------------------------------------------------
+ * Learning that the connection was lost and came back.
+ * ---------------------------------------------------------------------------------- */
+
 ZAL_END_DECLS
 
 #endif /* ZAL_IPOD_2_H */
