@@ -160,7 +160,10 @@ int safesend(int fd, const void *bytes, std::size_t size) {
 void zal_connection_drop_locked(zal_ipod_handle *h) {
     pthread_mutex_lock(&h->send_lock);
     int fd = h->fd.exchange(-1);
-    if (fd >= 0) close(fd);
+    if (fd >= 0) {
+        close(fd);
+        h->connection_changes.fetch_or(kConnectionLost);
+    }
     h->send_failed = false;
     h->peer_closed = false;
     h->rx_length = 0;
@@ -266,8 +269,10 @@ int zal_ipod_receive(zal_ipod_handle *h) {
         error = ENOMEM;
     }
     if (n <= 0) {
-        bool broken =
-            h->send_failed.load() || error == ECONNRESET || error == ENOTCONN || error == EBADF;
+        // An orderly close keeps the socket until a send fails, unless the application
+        // asked to hear about lost connections: then the close is a loss at once.
+        bool broken = h->send_failed.load() || error == ECONNRESET || error == ENOTCONN ||
+                      error == EBADF || (n == 0 && h->connection_cb.load() != nullptr);
         if (n == 0 && !broken) h->peer_closed = true;
         if (broken) zal_connection_drop_locked(h);
         pthread_mutex_unlock(&h->read_lock);
