@@ -322,8 +322,11 @@ ZAL_API uint16_t zal_ipod_set_config(zal_ipod_handle *h, const char *key, const 
 ZAL_API int zal_ipod_set_config_sync(zal_ipod_handle *h, const char *key, const char *value);
 /* GET_CONFIG for key; returns the request's transaction id. */
 ZAL_API uint16_t zal_ipod_get_config(zal_ipod_handle *h, const char *key);
-/* 1 with the value copied whole into out (room for the longest value the daemon returns),
- * else the daemon's error code, else -2 (no reply or neither in it; out untouched). */
+/* Room that zal_ipod_get_config_sync needs in out, terminator included. */
+#define ZAL_IPOD_CONFIG_VALUE_SIZE 1024
+/* 1 with the value copied whole into out, which must hold ZAL_IPOD_CONFIG_VALUE_SIZE
+ * bytes; else the daemon's error code; else -2 (no reply, neither in it, or a value too
+ * long for that room, which is logged and never cut: out is then untouched). */
 ZAL_API int zal_ipod_get_config_sync(zal_ipod_handle *h, const char *key, char *out);
 
 /* ---- Now playing -------------------------------------------------------------------------
