@@ -63,10 +63,15 @@ int split_packets(zal_ipod_handle *h) {
     uint32_t pos = 0;
     zal_ipod_reply *first = nullptr;
     zal_ipod_reply *last = nullptr;
+    bool broken = false;
     while (h->rx_length - pos >= kPacketHeaderSize) {
         const unsigned char *p = h->rx_buffer + pos;
         uint32_t length = read_be32(p + 8);
-        if (length > kMaxPayloadLength) return -1;
+        if (length > kMaxPayloadLength) {
+            // The whole packets before it are still queued; the caller drops the stream.
+            broken = true;
+            break;
+        }
         if (length > h->rx_length - pos - kPacketHeaderSize) {
             // Reserve the whole packet now: the reads that complete it append in place.
             rx_reserve(h, length - (h->rx_length - pos - static_cast<uint32_t>(kPacketHeaderSize)));
@@ -90,6 +95,7 @@ int split_packets(zal_ipod_handle *h) {
         ++queued;
     }
     queue_append(h, first, last, queued);
+    if (broken) return -1;
     if (pos > 0) {
         h->rx_length -= pos;
         if (h->rx_length > 0) memmove(h->rx_buffer, h->rx_buffer + pos, h->rx_length);
