@@ -273,6 +273,7 @@ int zal_ipod_receive(zal_ipod_handle *h) {
         error = errno;
     } else {
         error = ENOMEM;
+        ZAL_LOGE("%s: out of memory for the receive buffer\n", __func__);
     }
     if (n <= 0) {
         // An orderly close keeps the socket until a send fails, unless the application
