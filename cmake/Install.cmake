@@ -34,8 +34,7 @@ install(TARGETS zal-ipod-2 zal-ipod-2-static
     EXPORT zal-ipod-2-targets
     LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} NAMELINK_COMPONENT Development
     ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT Development
-    RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR}
-    INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
+    RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
 
 # The public headers. The library's private headers live in src/ and common/, never here.
 install(DIRECTORY ${PROJECT_SOURCE_DIR}/include/zal-ipod-2
@@ -76,8 +75,10 @@ install(FILES
 # pkg-config. The static library needs liblog, libcutils, threads and libdl after it;
 # neither Android library ships a .pc file on Debian, hence Libs.private, not Requires.
 set(ZAL_PC_LIBS_PRIVATE "")
+# Outside the loader's path too: the program needs a RUNPATH to them, as the shared
+# library has one.
 foreach(_dir ${_zal_android_dirs})
-    string(APPEND ZAL_PC_LIBS_PRIVATE " -L${_dir}")
+    string(APPEND ZAL_PC_LIBS_PRIVATE " -L${_dir} -Wl,-rpath,${_dir}")
 endforeach()
 string(APPEND ZAL_PC_LIBS_PRIVATE " -llog -lcutils -pthread")
 foreach(_lib ${CMAKE_DL_LIBS})
@@ -89,6 +90,7 @@ string(STRIP "${ZAL_PC_LIBS_PRIVATE}" ZAL_PC_LIBS_PRIVATE)
 # Relocatable: the prefix is found from where the .pc file lies, so that
 # `cmake --install --prefix <dir>` gives a working file too.
 file(RELATIVE_PATH ZAL_PC_TO_PREFIX "/prefix/${CMAKE_INSTALL_LIBDIR}/pkgconfig" "/prefix")
+string(REGEX REPLACE "/$" "" ZAL_PC_TO_PREFIX "${ZAL_PC_TO_PREFIX}")
 foreach(_dir LIBDIR INCLUDEDIR)
     if(IS_ABSOLUTE "${CMAKE_INSTALL_${_dir}}")
         set(ZAL_PC_${_dir} "${CMAKE_INSTALL_${_dir}}")
