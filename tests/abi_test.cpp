@@ -70,17 +70,20 @@ std::set<std::string> recorded_exports() {
     std::string line;
     std::smatch m;
     while (std::getline(map, line)) {
-        if (line.find("global:") != std::string::npos) in_global = true;
-        else if (line.find("local:") != std::string::npos) in_global = false;
-        else if (in_global && std::regex_match(line, m, entry)) names.insert(m[1]);
+        if (line.find("global:") != std::string::npos)
+            in_global = true;
+        else if (line.find("local:") != std::string::npos)
+            in_global = false;
+        else if (in_global && std::regex_match(line, m, entry))
+            names.insert(m[1]);
     }
     return names;
 }
 
 // The names the public headers declare with ZAL_API, as scripts/update-exports finds them.
 std::set<std::string> declared_exports() {
-    std::string command = std::string("CC='") + ZAL_C_COMPILER + "' '" + ZAL_UPDATE_EXPORTS +
-                          "' --list";
+    std::string command =
+        std::string("CC='") + ZAL_C_COMPILER + "' '" + ZAL_UPDATE_EXPORTS + "' --list";
     std::vector<std::string> lines = command_lines(command);
     return {lines.begin(), lines.end()};
 }

@@ -7,6 +7,10 @@
  *
  * Only the daemon reads the context. It is written during start-up by one thread, before
  * the daemon starts its others, and carries no lock.
+ *
+ * Threads: nothing here locks or calls back. Call the setters during start-up, and the
+ * registry functions from one thread at a time per registry (the daemon's own lock, if it
+ * shares a registry between threads). get_current_devices() only reads the registry.
  */
 #ifndef ZAL_IPOD_2_DAEMON_H
 #define ZAL_IPOD_2_DAEMON_H
@@ -36,7 +40,7 @@ ZAL_BEGIN_DECLS
 
 /** One EAP protocol name; the list keeps command-line order. */
 typedef struct eap_node {
-    char *name; /**< owned copy; null for the leading empty entry of ",a,b" */
+    char *name;            /**< owned copy; null for the leading empty entry of ",a,b" */
     struct eap_node *next; /**< the following name, or null */
 } eap_node;
 
@@ -61,8 +65,8 @@ typedef struct zal_daemon_context {
     char vehicle_information_component_displayName[ZAL_CONTEXT_TEXT_SIZE]; /**< shown name */
     char accessory_wifi_ssid[ZAL_CONTEXT_TEXT_SIZE];       /**< head unit's Wi-Fi network */
     char accessory_wifi_passphrase[ZAL_CONTEXT_TEXT_SIZE]; /**< and its passphrase */
-    ipod_usb_host_entry_points usb_host;           /**< -l */
-    ipod_media_library_entry_points media_library; /**< -m */
+    ipod_usb_host_entry_points usb_host;                   /**< -l */
+    ipod_media_library_entry_points media_library;         /**< -m */
     void *daemon_private[4]; /**< the daemon's own words; this code never touches them */
 } context;
 
@@ -163,15 +167,15 @@ typedef struct zal_attached_device {
     struct zal_attached_device *next;    /**< the next device, or null */
     char serial[ZAL_DEVICE_SERIAL_SIZE]; /**< key by which events find the entry */
     char name[ZAL_DEVICE_NAME_SIZE];     /**< the name the device gives itself */
-    int32_t protocol;           /**< 1 iAP1, 2 iAP2 */
-    int32_t iap2_authenticated; /**< authentication state when protocol is 2 */
-    zal_link_state link_state;  /**< authentication and mode (iAP1) */
-    int32_t link_kind; /**< ZAL_LINK_ */
-    int32_t usb_role;  /**< 1: the port is in the role where bus and address are not known */
+    int32_t protocol;                    /**< 1 iAP1, 2 iAP2 */
+    int32_t iap2_authenticated;          /**< authentication state when protocol is 2 */
+    zal_link_state link_state;           /**< authentication and mode (iAP1) */
+    int32_t link_kind;                   /**< ZAL_LINK_ */
+    int32_t usb_role;       /**< 1: the port is in the role where bus and address are not known */
     uint8_t usb_bus;        /**< USB bus number */
     uint8_t usb_address;    /**< USB device address on that bus */
     uint8_t rfcomm_channel; /**< RFCOMM channel of a Bluetooth link */
-    void *daemon_data; /**< the daemon's own; the registry neither reads nor frees it */
+    void *daemon_data;      /**< the daemon's own; the registry neither reads nor frees it */
 } zal_attached_device;
 
 /** Head of the daemon's list of attached devices; zero-fill it to start empty. */

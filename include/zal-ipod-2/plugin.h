@@ -96,8 +96,8 @@ typedef struct ipod_media_track {
     uint16_t track_count;     /**< tracks on the album */
     uint16_t disc_number;     /**< disc of the album, from 1 */
     uint16_t disc_count;      /**< discs of the album */
-    int32_t media_type; /**< the device's media type code (music, podcast, audiobook, ...) */
-    int32_t rating;     /**< 0 to 100, -1 when unknown */
+    int32_t media_type;       /**< the device's media type code (music, podcast, audiobook, ...) */
+    int32_t rating;           /**< 0 to 100, -1 when unknown */
 } ipod_media_track;
 
 /** One playlist; parent_persistent_id is 0 at the top level. */

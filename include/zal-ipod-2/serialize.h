@@ -41,9 +41,9 @@ enum {
  * points at a separately allocated body.
  */
 typedef struct gval {
-    uint32_t type;  /**< one of SERIALIZE_INT .. SERIALIZE_STRUCT */
-    void *data;     /**< payload, or the container body */
-    uint32_t len;   /**< 4 for int/float, payload bytes for string/bytes/struct */
+    uint32_t type; /**< one of SERIALIZE_INT .. SERIALIZE_STRUCT */
+    void *data;    /**< payload, or the container body */
+    uint32_t len;  /**< 4 for int/float, payload bytes for string/bytes/struct */
 } gval;
 
 /** Body of an array value: the items it owns, in order. */
@@ -55,10 +55,10 @@ typedef struct gval_array {
 
 /** Body of a hash value: unique keys in insertion order and the values they own. */
 typedef struct gval_hash {
-    char **keys;       /**< owned copies, insertion order */
-    gval **values;     /**< parallel to keys, owned */
-    int32_t capacity;  /**< slots allocated in keys and values */
-    int32_t count;     /**< entries held */
+    char **keys;      /**< owned copies, insertion order */
+    gval **values;    /**< parallel to keys, owned */
+    int32_t capacity; /**< slots allocated in keys and values */
+    int32_t count;    /**< entries held */
 } gval_hash;
 
 /** @name Constructors
@@ -189,10 +189,12 @@ ZAL_API uint32_t serialize_hash_pack(unsigned char *out, const gval *v);
 /** Readers: p points after the tag, remaining counts the bytes from p; *consumed grows by
  * the bytes used after the tag. They return NULL when the input is too short. */
 ZAL_API gval *serialize_int_unpack(const unsigned char *p, uint32_t remaining, uint32_t *consumed);
-ZAL_API gval *serialize_float_unpack(const unsigned char *p, uint32_t remaining, uint32_t *consumed);
-ZAL_API gval *serialize_string_unpack(const unsigned char *p, uint32_t remaining, uint32_t *consumed,
-                                      int kind);
-ZAL_API gval *serialize_array_unpack(const unsigned char *p, uint32_t remaining, uint32_t *consumed);
+ZAL_API gval *serialize_float_unpack(const unsigned char *p, uint32_t remaining,
+                                     uint32_t *consumed);
+ZAL_API gval *serialize_string_unpack(const unsigned char *p, uint32_t remaining,
+                                      uint32_t *consumed, int kind);
+ZAL_API gval *serialize_array_unpack(const unsigned char *p, uint32_t remaining,
+                                     uint32_t *consumed);
 ZAL_API gval *serialize_hash_unpack(const unsigned char *p, uint32_t remaining, uint32_t *consumed);
 /** @} */
 
