@@ -27,7 +27,9 @@ list(REMOVE_DUPLICATES _zal_android_dirs)
 get_filename_component(_zal_android_log_dir "${ANDROID_LOG_LIBRARY}" DIRECTORY)
 get_filename_component(_zal_android_cutils_dir "${ANDROID_CUTILS_LIBRARY}" DIRECTORY)
 
-set_target_properties(zal-ipod-2 PROPERTIES EXPORT_NAME zal-ipod-2 INSTALL_RPATH "${_zal_android_dirs}")
+set_target_properties(zal-ipod-2 PROPERTIES
+    EXPORT_NAME zal-ipod-2
+    INSTALL_RPATH "${_zal_android_dirs}")
 set_target_properties(zal-ipod-2-static PROPERTIES EXPORT_NAME static)
 
 install(TARGETS zal-ipod-2 zal-ipod-2-static
@@ -45,13 +47,17 @@ install(DIRECTORY ${PROJECT_SOURCE_DIR}/include/zal-ipod-2
 # The programs, when this build has them. They find the library next to them (../lib).
 file(RELATIVE_PATH _zal_bin_to_lib
     "${CMAKE_INSTALL_FULL_BINDIR}" "${CMAKE_INSTALL_FULL_LIBDIR}")
-foreach(_tool zald-sim zalctl)
-    if(TARGET ${_tool})
-        set_target_properties(${_tool} PROPERTIES
-            INSTALL_RPATH "$ORIGIN/${_zal_bin_to_lib};${_zal_android_dirs}")
-        install(TARGETS ${_tool} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
-    endif()
-endforeach()
+function(zal_install_program program)
+    set_target_properties(${program} PROPERTIES
+        INSTALL_RPATH "$ORIGIN/${_zal_bin_to_lib};${_zal_android_dirs}")
+    install(TARGETS ${program} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+endfunction()
+if(TARGET zald-sim)
+    zal_install_program(zald-sim)
+endif()
+if(TARGET zalctl)
+    zal_install_program(zalctl)
+endif()
 
 # CMake package: zal-ipod-2::zal-ipod-2 (shared) and zal-ipod-2::static.
 install(EXPORT zal-ipod-2-targets
