@@ -2,10 +2,12 @@
 // shared library, that record equal to the headers' declarations, and the library loadable
 // by path.
 #include <dlfcn.h>
+#include <sys/stat.h>
 #include <gtest/gtest.h>
 
 #include <algorithm>
 #include <cstdio>
+#include <filesystem>
 #include <fstream>
 #include <iterator>
 #include <set>
@@ -80,10 +82,12 @@ std::set<std::string> recorded_exports() {
     return names;
 }
 
-// The names the public headers declare with ZAL_API, as scripts/update-exports finds them.
-std::set<std::string> declared_exports() {
-    std::string command =
-        std::string("CC='") + ZAL_C_COMPILER + "' '" + ZAL_UPDATE_EXPORTS + "' --list";
+// The names that scripts/update-exports finds declared with ZAL_API, in the public headers
+// or, given include_dir, in <include_dir>/zal-ipod-2/*.h.
+std::set<std::string> declared_exports(const std::string &include_dir = "") {
+    std::string command = std::string("CC='") + ZAL_C_COMPILER + "' ";
+    if (!include_dir.empty()) command += "ZAL_EXPORTS_INCLUDE='" + include_dir + "' ";
+    command += std::string("'") + ZAL_UPDATE_EXPORTS + "' --list";
     std::vector<std::string> lines = command_lines(command);
     return {lines.begin(), lines.end()};
 }
@@ -121,6 +125,56 @@ TEST(Abi, RecordedListIsWhatTheHeadersDeclare) {
     for (const std::string &name : minus(recorded, declared))
         ADD_FAILURE() << name << " is in cmake/libzal-ipod-2.map but no public header declares "
                       << "it ZAL_API: run scripts/update-exports";
+}
+
+// The lister reads declarations as the compiler does: whatever their layout, through the
+// macros that declare them, and only those marked ZAL_API.
+TEST(Abi, ExportListerFindsEveryShapeOfDeclaration) {
+    char dir_template[] = "/tmp/zal-abi-XXXXXX";
+    ASSERT_NE(mkdtemp(dir_template), nullptr);
+    const std::string dir = dir_template;
+    ASSERT_EQ(mkdir((dir + "/zal-ipod-2").c_str(), 0700), 0);
+    {
+        std::ifstream real(std::string(ZAL_PUBLIC_INCLUDE_DIR) + "/zal-ipod-2/zal_export.h");
+        std::ofstream copy(dir + "/zal-ipod-2/zal_export.h");
+        copy << real.rdbuf();
+    }
+    std::ofstream(dir + "/zal-ipod-2/shapes.h") << R"(
+#include <stdint.h>
+#include "zal_export.h"
+#define ZAL_PLUGIN_EXPORT __attribute__((visibility("default")))
+#define PAIR(name) ZAL_API int pair_##name(void); ZAL_API int pair_##name##_sync(void);
+ZAL_BEGIN_DECLS
+ZAL_API int plain(void);
+ZAL_API const char *const *
+    pointer_result_over_lines(const char *a,
+                              int (*callback)(int, void *));
+ZAL_API void with_printf_check(const char *fmt, ...) ZAL_PRINTF(1, 2);
+ZAL_PRINTF(1, 2) ZAL_API int attribute_first(const char *fmt, ...);
+extern ZAL_API int data_symbol;
+extern ZAL_API char data_array[16];
+typedef int callback_fn(void);
+ZAL_API callback_fn through_typedef;
+PAIR(made)
+ZAL_PLUGIN_EXPORT int plugin_entry_point(void);
+int not_exported(void);
+/* ZAL_API int commented_out(void); */
+#if 0
+ZAL_API int compiled_out(void);
+#endif
+ZAL_END_DECLS
+)";
+    std::set<std::string> expected = {"attribute_first",
+                                      "data_array",
+                                      "data_symbol",
+                                      "pair_made",
+                                      "pair_made_sync",
+                                      "plain",
+                                      "pointer_result_over_lines",
+                                      "through_typedef",
+                                      "with_printf_check"};
+    EXPECT_EQ(declared_exports(dir), expected);
+    std::filesystem::remove_all(dir);
 }
 
 TEST(Abi, LibraryLoadsByPathAndResolvesItsApi) {
