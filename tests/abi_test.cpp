@@ -44,7 +44,7 @@ std::vector<std::string> exported_symbols() {
 
 TEST(Abi, SharedLibraryExportsOnlyTheCApi) {
     const std::regex api(
-        "zal_.*|serialize.*|unserialize|print_hex|parse_arguments|set_context_.*|common_init|"
+        "zal_.*|_zal_ipod_.*|serialize.*|unserialize|print_hex|parse_arguments|set_context_.*|common_init|"
         "common_log_init|_log_fp|print_time_stamp|get_function_string|get_event_string|"
         "get_device_event_string|get_current_devices|get_next_id|getVersionLevel[012]|"
         "getReleaseVersion");
