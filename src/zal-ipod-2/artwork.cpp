@@ -19,7 +19,12 @@
 #include "zal-ipod-2/playback_state.h"
 
 void zal_artwork_state::drop_buffer() {
-    if (data != nullptr && data != mapping) free(data);
+    if (image_value != nullptr) {
+        serialize_free(image_value);
+        image_value = nullptr;
+    } else if (data != nullptr && data != mapping) {
+        free(data);
+    }
     if (data != mapping) {
         data = nullptr;
         data_capacity = 0;
@@ -112,30 +117,51 @@ int32_t store_shared(zal_artwork_state &a, const char *path) {
     return 1;
 }
 
-// Pixels inside the reply: one allocation, one copy. The buffer is never shorter than
-// height x row stride (the tail zero-filled when the reply carries fewer bytes), so a
-// client that reads as many bytes as the length accessor reports stays inside it.
-int32_t store_inline(zal_artwork_state &a, const gval *image) {
-    uint32_t count = 0;
-    const void *bytes = serialize_get_bytes(image, &count);
-    const std::size_t size = std::max<std::size_t>(count, uint32_t{a.height} * a.rowstride);
-    unsigned char *copy = nullptr;
-    if (size > 0) {
-        copy = static_cast<unsigned char *>(malloc(size));
-        if (copy == nullptr) {
-            ZAL_LOGE("artwork: no memory for %zu bytes of pixels\n", size);
-            return -1;
-        }
-        if (count > 0) memcpy(copy, bytes, count);
-        if (size > count) memset(copy + count, 0, size - count);
+// Detaches the value under key from a decoded hash that is released right after; the
+// hash keeps a null in its place.
+gval *take_hash_value(gval *hash, const char *key) {
+    auto *body = static_cast<gval_hash *>(hash->data);
+    for (int32_t i = 0; i < body->count; ++i) {
+        if (strcmp(body->keys[i], key) != 0) continue;
+        gval *value = body->values[i];
+        body->values[i] = nullptr;
+        return value;
     }
-    a.drop_buffer();  // the mapping, if any, stays mapped for a later shared-file reply
+    return nullptr;
+}
+
+// Pixels inside the reply: one allocation and one copy in all, the ones that decoding
+// the reply made; the data points into that decoded value, which the record keeps. Only a
+// reply with fewer bytes than height x row stride is copied into a buffer of that size
+// (the tail zero-filled), so that a client that reads as many bytes as the length
+// accessor reports always stays inside the pixels.
+int32_t store_inline(zal_artwork_state &a, gval *hash) {
+    gval *image = serialize_hash_get(hash, "image");
+    uint32_t count = 0;
+    auto *bytes =
+        static_cast<unsigned char *>(const_cast<void *>(serialize_get_bytes(image, &count)));
+    const std::size_t needed = uint32_t{a.height} * a.rowstride;
+    if (count >= needed) {
+        a.drop_buffer();  // the mapping, if any, stays mapped for a later shared-file reply
+        a.image_value = take_hash_value(hash, "image");
+        a.data = count > 0 ? bytes : nullptr;
+        a.data_capacity = count;
+        return 1;
+    }
+    auto *copy = static_cast<unsigned char *>(malloc(needed));
+    if (copy == nullptr) {
+        ZAL_LOGE("artwork: no memory for %zu bytes of pixels\n", needed);
+        return -1;
+    }
+    if (count > 0) memcpy(copy, bytes, count);
+    memset(copy + count, 0, needed - count);
+    a.drop_buffer();
     a.data = copy;
-    a.data_capacity = size;
+    a.data_capacity = needed;
     return 1;
 }
 
-int32_t read_artwork(zal_ipod_handle *h, const gval *hash) {
+int32_t read_artwork(zal_ipod_handle *h, gval *hash) {
     const char *path = zal_hash_string(hash, "image_path");
     gval *image = serialize_hash_get(hash, "image");
     // A reply that carries neither pixels nor a file leaves the previous picture alone.
@@ -146,7 +172,7 @@ int32_t read_artwork(zal_ipod_handle *h, const gval *hash) {
     a.height = static_cast<uint16_t>(zal_hash_int(hash, "height", 0));
     a.rowstride = static_cast<uint16_t>(zal_hash_int(hash, "rowstride", 0));
     if (path != nullptr) return store_shared(a, path);
-    if (store_inline(a, image) < 0) return -1;
+    if (store_inline(a, hash) < 0) return -1;
     gval *format = serialize_hash_get(hash, "pixel_format");
     if (zal_kind(format) == SERIALIZE_INT) {
         a.pixel_format = static_cast<uint8_t>(serialize_get_int(format));
@@ -207,8 +233,20 @@ int32_t decode_times(zal_ipod_handle *h, const zal_ipod_reply *reply, int32_t **
 
 }  // namespace
 
+// The hash reply rule, on a decoded value that the decoder may take the pixels out of.
 int32_t zal_artwork_decode(zal_ipod_handle *h, const zal_ipod_reply *reply) {
-    return zal_decode_hash(h, reply, read_artwork);
+    gval *v = reply_value(reply);
+    int32_t result = -1;
+    if (zal_kind(v) == SERIALIZE_HASH) {
+        gval *error = serialize_hash_get(v, "error");
+        if (error != nullptr)
+            zal_set_error_message(
+                h, zal_kind(error) == SERIALIZE_STRING ? serialize_get_string(error) : "");
+        else
+            result = read_artwork(h, v);
+    }
+    serialize_free(v);
+    return result;
 }
 
 extern "C" {

@@ -9,6 +9,8 @@
 #include <cstddef>
 #include <cstdint>
 
+#include "zal-ipod-2/serialize.h"
+
 struct zal_ipod_handle;
 
 struct zal_artwork_state {
@@ -23,6 +25,9 @@ struct zal_artwork_state {
     // Bytes readable at data (the mapping's length or the buffer's size). The length
     // accessor never reports more than this, whatever the geometry or "data_length" say.
     std::size_t data_capacity = 0;
+    // The decoded bytes value of an inline reply when data points into it (the pixels are
+    // kept where the reply's decoding put them instead of being copied once more).
+    gval *image_value = nullptr;
 
     zal_artwork_state() = default;
     zal_artwork_state(const zal_artwork_state &) = delete;
