@@ -2,7 +2,9 @@
 #include "client_fuzz_commands.h"
 
 #include <cstddef>
+#include <cstdlib>
 #include <cstring>
+#include <initializer_list>
 
 namespace {
 
@@ -56,6 +58,47 @@ const Command kCommands[] = {
     [](zal_ipod_handle *h) { use(zal_ipod_add_to_cart_sync(h)); },
     [](zal_ipod_handle *h) { use(zal_ipod_start_bt_connection_updates_sync(h)); },
     [](zal_ipod_handle *h) { use(zal_ipod_stop_bt_connection_updates_sync(h)); },
+    // Now playing.
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_info_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_sample_rate_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_is_audiobook_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_contains_video_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_play_state_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_device_current_draw_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_device_charge_if_power_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_current_track_index_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_shuffle_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_repeat_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_chapter_index_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_chapter_count_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_position_sync(h, 1000)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_track_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_current_playing_track_chapter_sync(h, 1)); },
+    [](zal_ipod_handle *h) {
+        use(zal_ipod_get_current_playing_track_chapter_play_status_sync(h, 0));
+    },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_shuffle_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_repeat_sync(h, 2)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_write_tag_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_color_display_image_limits_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_preference_sync(h, 8)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_preference_sync(h, 8, 9)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_ipod_preference_sync(h, 3)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_ipod_preference_sync(h, 3, 1)); },
+    [](zal_ipod_handle *h) {
+        serialize_free(zal_ipod_health_examine(h, "fuzz", serialize_int(1)));
+    },
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_artwork_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_pos_artwork_sync(h, 0, 1000)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_track_artwork_by_uid_sync(h, 0x0102030405060708ull)); },
+    [](zal_ipod_handle *h) {
+        int32_t *times = nullptr;
+        int32_t count = 0;
+        if (zal_ipod_current_track_artwork_times_sync(h, 0, &times, &count) == 1) {
+            for (int32_t i = 0; i < count; ++i) use(times[i]);
+            free(times);
+        }
+    },
 };
 
 }  // namespace
@@ -148,4 +191,41 @@ void zal_fuzz_read_handle(zal_ipod_handle *h) {
     use(zal_ipod_current_session(h));
     use(zal_ipod_is_session_opened(h));
     use(zal_ipod_is_ready(h));
+    use_text(zal_ipod_current_track_title(h));
+    use_text(zal_ipod_current_track_chapter(h));
+    use_text(zal_ipod_current_track_artist(h));
+    use_text(zal_ipod_current_track_album(h));
+    use_text(zal_ipod_current_track_artwork_name(h));
+    use_text(zal_ipod_last_known_librevision(h));
+    use_text(zal_ipod_playing_app(h));
+    for (int (*get)(zal_ipod_handle *) : {zal_ipod_current_track_length,
+                                          zal_ipod_current_track_position,
+                                          zal_ipod_current_track_state,
+                                          zal_ipod_init_state,
+                                          zal_ipod_current_number_of_tracks,
+                                          zal_ipod_current_track_index,
+                                          zal_ipod_current_chapter_index,
+                                          zal_ipod_current_chapter_count,
+                                          zal_ipod_current_chapter_length,
+                                          zal_ipod_current_chapter_position,
+                                          zal_ipod_current_sample_rate,
+                                          zal_ipod_current_track_timestamp,
+                                          zal_ipod_current_track_timestamp_usec,
+                                          zal_ipod_current_track_has_artwork,
+                                          zal_ipod_current_track_has_chapters,
+                                          zal_ipod_current_shuffle_state,
+                                          zal_ipod_current_repeat_state,
+                                          zal_ipod_get_color_display_image_limits_maxImageWidth,
+                                          zal_ipod_get_color_display_image_limits_maxImageHeigh,
+                                          zal_ipod_get_color_display_image_limits_pixelFormat})
+        use(get(h));
+    // Every byte the artwork record says it holds is read.
+    const unsigned char *pixels = zal_ipod_current_track_artwork_data(h);
+    const uint32_t length = zal_ipod_current_track_artwork_length(h);
+    long sum = 0;
+    for (uint32_t i = 0; pixels != nullptr && i < length; ++i) sum += pixels[i];
+    use(sum);
+    use(zal_ipod_current_track_artwork_width(h) + zal_ipod_current_track_artwork_height(h) +
+        zal_ipod_current_track_artwork_rowstride(h) +
+        zal_ipod_current_track_artwork_pixel_format(h));
 }

@@ -393,6 +393,243 @@ ZAL_API int zal_ipod_get_config_sync(zal_ipod_handle *h, const char *key, char *
  * Playback state, the current-track cache and artwork.
  * ---------------------------------------------------------------------------------- */
 
+/* Every command below has the asynchronous form (returns the transaction id, 0 when the
+ * handle is not ready) and the _sync form (waits and returns the decoded result, -1 on any
+ * failure unless said otherwise). Replies to the asynchronous forms of the track-info,
+ * sample-rate, play-state, chapter-status, track-index, preference and artwork requests
+ * update the same cache when a reply callback takes them. */
+
+/* CURRENT_TRACK_INFO. _sync: the reply's "current_track_info" result (1 when a track is
+ * current). Fills title, chapter, artist, album and artwork name (those present), and
+ * length, position, state, track index, number of tracks, has artwork, has chapters and
+ * the time stamp (-1, or 0 for the time stamp, when absent). */
+ZAL_API int zal_ipod_current_track_info(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_current_track_info. */
+ZAL_API int zal_ipod_current_track_info_sync(zal_ipod_handle *h);
+/* CURRENT_TRACK_SAMPLE_RATE. _sync: the sample rate, also cached. */
+ZAL_API int zal_ipod_current_track_sample_rate(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_current_track_sample_rate. */
+ZAL_API int zal_ipod_current_track_sample_rate_sync(zal_ipod_handle *h);
+/* CURRENT_TRACK_IS_AUDIOBOOK. _sync: the reply's "is_audiobook_explicitly" (not cached). */
+ZAL_API int zal_ipod_current_track_is_audiobook(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_current_track_is_audiobook. */
+ZAL_API int zal_ipod_current_track_is_audiobook_sync(zal_ipod_handle *h);
+/* CURRENT_TRACK_CONTAINS_VIDEO. _sync: the reply's "contains_video_explicitly". */
+ZAL_API int zal_ipod_current_track_contains_video(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_current_track_contains_video. */
+ZAL_API int zal_ipod_current_track_contains_video_sync(zal_ipod_handle *h);
+/* GET_PLAY_STATE. _sync: the play status, cached with the track length and position. */
+ZAL_API int zal_ipod_get_play_state(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_get_play_state. */
+ZAL_API int zal_ipod_get_play_state_sync(zal_ipod_handle *h);
+/* GET_CURRENT_DRAW. _sync: the device's current draw ("current_draw"). */
+ZAL_API int zal_ipod_device_current_draw(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_device_current_draw. */
+ZAL_API int zal_ipod_device_current_draw_sync(zal_ipod_handle *h);
+/* GET_IF_CHARGE. _sync: whether the device charges from its power ("if_charge"). */
+ZAL_API int zal_ipod_device_charge_if_power(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_device_charge_if_power. */
+ZAL_API int zal_ipod_device_charge_if_power_sync(zal_ipod_handle *h);
+/* GET_CURRENT_TRACK_INDEX. _sync: the index, also cached (-1 after any failure). */
+ZAL_API int zal_ipod_get_current_track_index(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_get_current_track_index. */
+ZAL_API int zal_ipod_get_current_track_index_sync(zal_ipod_handle *h);
+/* GET_SHUFFLE. _sync: the shuffle mode. */
+ZAL_API int zal_ipod_get_shuffle(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_get_shuffle. */
+ZAL_API int zal_ipod_get_shuffle_sync(zal_ipod_handle *h);
+/* Same as zal_ipod_get_shuffle_sync (kept for older applications). */
+ZAL_API int _zal_ipod_get_shuffle_sync(zal_ipod_handle *h);
+/* GET_REPEAT. _sync: the repeat mode. */
+ZAL_API int zal_ipod_get_repeat(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_get_repeat. */
+ZAL_API int zal_ipod_get_repeat_sync(zal_ipod_handle *h);
+/* Same as zal_ipod_get_repeat_sync (kept for older applications). */
+ZAL_API int _zal_ipod_get_repeat_sync(zal_ipod_handle *h);
+/* GET_CURRENT_PLAYING_TRACK_CHAPTER_INDEX. _sync: the chapter index. */
+ZAL_API int zal_ipod_get_chapter_index(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_get_chapter_index. */
+ZAL_API int zal_ipod_get_chapter_index_sync(zal_ipod_handle *h);
+/* Same as zal_ipod_get_chapter_index_sync (kept for older applications). */
+ZAL_API int _zal_ipod_get_chapter_index_sync(zal_ipod_handle *h);
+/* GET_CURRENT_PLAYING_TRACK_CHAPTER_COUNT. _sync: the number of chapters. */
+ZAL_API int zal_ipod_get_chapter_count(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_get_chapter_count. */
+ZAL_API int zal_ipod_get_chapter_count_sync(zal_ipod_handle *h);
+/* Same as zal_ipod_get_chapter_count_sync (kept for older applications). */
+ZAL_API int _zal_ipod_get_chapter_count_sync(zal_ipod_handle *h);
+/* SET_POSITION: moves to position (the device's unit, milliseconds in practice). */
+ZAL_API int zal_ipod_set_position(zal_ipod_handle *h, int position);
+/* Synchronous form of zal_ipod_set_position; the daemon's integer. */
+ZAL_API int zal_ipod_set_position_sync(zal_ipod_handle *h, int position);
+/* SET_TRACK: plays the track at index of the current play list. */
+ZAL_API int zal_ipod_set_track(zal_ipod_handle *h, int index);
+/* Synchronous form of zal_ipod_set_track. */
+ZAL_API int zal_ipod_set_track_sync(zal_ipod_handle *h, int index);
+/* SET_CURRENT_PLAYING_TRACK_CHAPTER: moves to a chapter of the current track. */
+ZAL_API int zal_ipod_set_current_playing_track_chapter(zal_ipod_handle *h, int chapter);
+/* Synchronous form of zal_ipod_set_current_playing_track_chapter. */
+ZAL_API int zal_ipod_set_current_playing_track_chapter_sync(zal_ipod_handle *h, int chapter);
+/* GET_CURRENT_PLAYING_TRACK_CHAPTER_PLAY_STATUS for a chapter. _sync: 0, with the chapter
+ * length and position cached (-1 when absent). */
+ZAL_API int zal_ipod_get_current_playing_track_chapter_play_status(zal_ipod_handle *h,
+                                                                   int chapter);
+/* Synchronous form of zal_ipod_get_current_playing_track_chapter_play_status. */
+ZAL_API int zal_ipod_get_current_playing_track_chapter_play_status_sync(zal_ipod_handle *h,
+                                                                        int chapter);
+/* SET_SHUFFLE with the device's mode number. */
+ZAL_API int zal_ipod_set_shuffle(zal_ipod_handle *h, int mode);
+/* Synchronous form of zal_ipod_set_shuffle. */
+ZAL_API int zal_ipod_set_shuffle_sync(zal_ipod_handle *h, int mode);
+/* SET_REPEAT with the device's mode number. */
+ZAL_API int zal_ipod_set_repeat(zal_ipod_handle *h, int mode);
+/* Synchronous form of zal_ipod_set_repeat. */
+ZAL_API int zal_ipod_set_repeat_sync(zal_ipod_handle *h, int mode);
+/* WRITE_TAG. */
+ZAL_API int zal_ipod_write_tag(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_write_tag; the daemon's integer. */
+ZAL_API int zal_ipod_write_tag_sync(zal_ipod_handle *h);
+/* GET_COLOR_DISPLAY_IMAGE_LIMITS. _sync: 1 for any reply (the limits cached from a reply
+ * hash, 0 for a missing key), 0 without a reply. */
+ZAL_API int zal_ipod_get_color_display_image_limits(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_get_color_display_image_limits. */
+ZAL_API int zal_ipod_get_color_display_image_limits_sync(zal_ipod_handle *h);
+
+/* Preferences. A setting number names one (class, value) pair: 0-1 class 0, 2-3 class 1,
+ * 4-5 class 2, 6-7 class 3 (values 0, 1), 8-10 class 8 (values 1-3), 11-12 class 9,
+ * 13-14 class 10, 15-16 class 12, 17-18 class 13 (values 0, 1); 255 means none. A class
+ * other than 0, 1, 2, 3, 8, 9, 10, 12, 13 is sent as class 0. */
+/* GET_PREFERENCE for the class. */
+ZAL_API int zal_ipod_get_preference(zal_ipod_handle *h, uint32_t preference_class);
+/* Synchronous form: the setting number of (class, answer); 255 for a pair without one,
+ * an error or no answer. */
+ZAL_API int zal_ipod_get_preference_sync(zal_ipod_handle *h, uint32_t preference_class);
+/* SET_PREFERENCE with (class, the value of setting); a setting outside 1..18 sends 0. */
+ZAL_API int zal_ipod_set_preference(zal_ipod_handle *h, uint32_t preference_class, int setting);
+/* Synchronous form of zal_ipod_set_preference; the daemon's integer. */
+ZAL_API int zal_ipod_set_preference_sync(zal_ipod_handle *h, uint32_t preference_class,
+                                         int setting);
+/* GET_PREFERENCE with the class as given (no setting numbers). */
+ZAL_API int zal_ipod_get_ipod_preference(zal_ipod_handle *h, uint32_t preference_class);
+/* Synchronous form: the raw value; 255 without a reply or for one that is no integer. */
+ZAL_API int zal_ipod_get_ipod_preference_sync(zal_ipod_handle *h, uint32_t preference_class);
+/* SET_PREFERENCE with (class, value) as given. */
+ZAL_API int zal_ipod_set_ipod_preference(zal_ipod_handle *h, uint32_t preference_class,
+                                         int value);
+/* Synchronous form of zal_ipod_set_ipod_preference; the daemon's integer. */
+ZAL_API int zal_ipod_set_ipod_preference_sync(zal_ipod_handle *h, uint32_t preference_class,
+                                              int value);
+
+/* HEALTH_EXAMINE (synchronous only; sent on any connected handle): sends [name, extra]
+ * (extra left out when NULL; it is taken and freed) and returns the decoded reply, which
+ * the caller frees with serialize_free; NULL without a reply. */
+ZAL_API gval *zal_ipod_health_examine(zal_ipod_handle *h, const char *name, gval *extra);
+
+/* The last known library revision: a copy kept by the handle (no traffic). */
+ZAL_API void zal_ipod_set_last_known_librevision(zal_ipod_handle *h, const char *revision);
+/* The stored revision or NULL; owned by the handle. */
+ZAL_API const char *zal_ipod_last_known_librevision(zal_ipod_handle *h);
+/* Forgets the stored revision. */
+ZAL_API void zal_ipod_free_last_known_librevision(zal_ipod_handle *h);
+
+/* Cache getters (no traffic, never fail). Texts are owned by the handle and valid until the
+ * next reply or event replaces them; integers are -1 when unknown (and for a NULL handle).
+ * Connect and every session open forget length, position, state, number of tracks, track
+ * and chapter numbers, sample rate, time stamp and has artwork; texts survive. */
+/* Title of the current track. */
+ZAL_API const char *zal_ipod_current_track_title(zal_ipod_handle *h);
+/* Chapter name of the current track. */
+ZAL_API const char *zal_ipod_current_track_chapter(zal_ipod_handle *h);
+/* Artist of the current track. */
+ZAL_API const char *zal_ipod_current_track_artist(zal_ipod_handle *h);
+/* Album of the current track. */
+ZAL_API const char *zal_ipod_current_track_album(zal_ipod_handle *h);
+/* Artwork name (track information or the "artwork transfer done" event). */
+ZAL_API const char *zal_ipod_current_track_artwork_name(zal_ipod_handle *h);
+/* Track length. */
+ZAL_API int zal_ipod_current_track_length(zal_ipod_handle *h);
+/* Track position. */
+ZAL_API int zal_ipod_current_track_position(zal_ipod_handle *h);
+/* Play state (the device's numbers: 0 stopped, 1 playing, 2 paused, ...). */
+ZAL_API int zal_ipod_current_track_state(zal_ipod_handle *h);
+/* Init state from the "init state" event. */
+ZAL_API int zal_ipod_init_state(zal_ipod_handle *h);
+/* Name of the playing application (a 256-byte buffer of the handle, "" before any). */
+ZAL_API const char *zal_ipod_playing_app(zal_ipod_handle *h);
+/* Number of tracks of the current play list. */
+ZAL_API int zal_ipod_current_number_of_tracks(zal_ipod_handle *h);
+/* Index of the current track (-1 for a track of length 0). */
+ZAL_API int zal_ipod_current_track_index(zal_ipod_handle *h);
+/* Current chapter index. */
+ZAL_API int zal_ipod_current_chapter_index(zal_ipod_handle *h);
+/* Chapter count (0 after a reset). */
+ZAL_API int zal_ipod_current_chapter_count(zal_ipod_handle *h);
+/* Length of the chapter last asked about. */
+ZAL_API int zal_ipod_current_chapter_length(zal_ipod_handle *h);
+/* Position in the chapter last asked about. */
+ZAL_API int zal_ipod_current_chapter_position(zal_ipod_handle *h);
+/* Sample rate of the current track. */
+ZAL_API int zal_ipod_current_sample_rate(zal_ipod_handle *h);
+/* Time stamp (seconds) of the last track information (0 when none). */
+ZAL_API int zal_ipod_current_track_timestamp(zal_ipod_handle *h);
+/* Microseconds of that time stamp. */
+ZAL_API int zal_ipod_current_track_timestamp_usec(zal_ipod_handle *h);
+/* Whether the current track has artwork. */
+ZAL_API int zal_ipod_current_track_has_artwork(zal_ipod_handle *h);
+/* Whether the current track has chapters. */
+ZAL_API int zal_ipod_current_track_has_chapters(zal_ipod_handle *h);
+/* Shuffle mode from the last event. */
+ZAL_API int zal_ipod_current_shuffle_state(zal_ipod_handle *h);
+/* Repeat mode from the last event. */
+ZAL_API int zal_ipod_current_repeat_state(zal_ipod_handle *h);
+/* Largest picture width the display accepts (colour display limits). */
+ZAL_API int zal_ipod_get_color_display_image_limits_maxImageWidth(zal_ipod_handle *h);
+/* Largest picture height the display accepts (the name is spelt as the reply key). */
+ZAL_API int zal_ipod_get_color_display_image_limits_maxImageHeigh(zal_ipod_handle *h);
+/* Pixel format the display accepts. */
+ZAL_API int zal_ipod_get_color_display_image_limits_pixelFormat(zal_ipod_handle *h);
+
+/* Artwork. The _sync forms wait at least 20 s (a shorter reply time-out is raised for the
+ * call and restored after it) and return 1 when a picture was stored, -1 otherwise (the
+ * previous picture then stays, except when a shared file named by the reply cannot be
+ * mapped: the record is then empty). Pixels that the daemon shares through a file are
+ * mapped, not copied; the mapping is kept while it is large enough. */
+/* CURRENT_TRACK_ARTWORK with the device's artwork format number. */
+ZAL_API int zal_ipod_current_track_artwork(zal_ipod_handle *h, int value);
+/* Synchronous form of zal_ipod_current_track_artwork. */
+ZAL_API int zal_ipod_current_track_artwork_sync(zal_ipod_handle *h, int value);
+/* CURRENT_TRACK_POS_ARTWORK: the picture at a time position of the current track. */
+ZAL_API int zal_ipod_current_track_pos_artwork(zal_ipod_handle *h, int value, int position);
+/* Synchronous form of zal_ipod_current_track_pos_artwork. */
+ZAL_API int zal_ipod_current_track_pos_artwork_sync(zal_ipod_handle *h, int value, int position);
+/* GET_TRACK_ARTWORK_BY_UID: the picture of the track with this persistent identifier. */
+ZAL_API int zal_ipod_track_artwork_by_uid(zal_ipod_handle *h, uint64_t uid);
+/* Synchronous form of zal_ipod_track_artwork_by_uid. */
+ZAL_API int zal_ipod_track_artwork_by_uid_sync(zal_ipod_handle *h, uint64_t uid);
+/* CURRENT_TRACK_ARTWORK_TIMES with the device's artwork format number. */
+ZAL_API int zal_ipod_current_track_artwork_times(zal_ipod_handle *h, int value);
+/* Synchronous form: 1 with *times (malloc'ed, the caller frees it) holding *count time
+ * positions; -1 when there are none (*count is then 0 or -1 and *times untouched), on
+ * any failure, or for a reply that is not a list of integers (both left untouched). */
+ZAL_API int zal_ipod_current_track_artwork_times_sync(zal_ipod_handle *h, int value,
+                                                      int32_t **times, int32_t *count);
+/* Pixel bytes of the last picture, or NULL. Owned by the handle; valid until the next
+ * artwork reply, session open or close. Shared-file pixels change when the daemon writes
+ * the file again. */
+ZAL_API const unsigned char *zal_ipod_current_track_artwork_data(zal_ipod_handle *h);
+/* Width of the last picture in pixels. */
+ZAL_API uint16_t zal_ipod_current_track_artwork_width(zal_ipod_handle *h);
+/* Height of the last picture in rows. */
+ZAL_API uint16_t zal_ipod_current_track_artwork_height(zal_ipod_handle *h);
+/* Bytes per row of the last picture. */
+ZAL_API uint16_t zal_ipod_current_track_artwork_rowstride(zal_ipod_handle *h);
+/* Pixel format of the last picture as the device gives it; 255: encoded data whose length
+ * is given explicitly. */
+ZAL_API uint8_t zal_ipod_current_track_artwork_pixel_format(zal_ipod_handle *h);
+/* Bytes of the last picture: height x row stride, or the explicit data length when that
+ * product is 0; never more than the bytes readable at the data pointer. */
+ZAL_API uint32_t zal_ipod_current_track_artwork_length(zal_ipod_handle *h);
+
 /* ---- Accessory input and video out -------------------------------------------------------
  * Buttons, rotation, HID, VoiceOver and video-out settings.
  * ---------------------------------------------------------------------------------- */

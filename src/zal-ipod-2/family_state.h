@@ -6,13 +6,10 @@
 
 #include <cstdint>
 
+#include "zal-ipod-2/artwork_state.h"
+
 // iAP1 database browsing: record counts and results of the last category requests.
 struct zal_records_state {
     int32_t record_count = 0;
-    void reset() {}
-};
-
-// Artwork of the current track (buffer, mapped file, geometry).
-struct zal_artwork_state {
     void reset() {}
 };

@@ -34,14 +34,14 @@ int32_t adjust_preference(zal_ipod_handle *h, int32_t result) {
 using S = zal_pending_slots;
 
 constexpr zal_reply_decoder_row kDecoders[] = {
-    {&S::track_info_tid, nullptr, true},          // track info, key "current_track_info"
-    {&S::indexed_track_info_tid, nullptr, true},  // track info, key "indexed_track_info"
-    {&S::play_state_tid, nullptr, false},
+    {&S::track_info_tid, zal_decode_current_track_info, true},
+    {&S::indexed_track_info_tid, zal_decode_indexed_track_info, true},
+    {&S::play_state_tid, zal_decode_play_state, false},
     {&S::chapter_index_tid, decode_chapter_index, false},
-    {&S::chapter_status_tid, nullptr, false},
-    {&S::artwork_by_uid_tid, nullptr, true},
-    {&S::artwork_tid, nullptr, true},
-    {&S::sample_rate_tid, nullptr, true},
+    {&S::chapter_status_tid, zal_decode_chapter_status, false},
+    {&S::artwork_by_uid_tid, zal_artwork_decode, true},
+    {&S::artwork_tid, zal_artwork_decode, true},
+    {&S::sample_rate_tid, zal_decode_sample_rate, true},
     {&S::records_tid, nullptr, false},
     {&S::session_tid, zal_session_decode_open, false},
     {&S::itunes_info_tid, nullptr, false},

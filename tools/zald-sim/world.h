@@ -28,6 +28,11 @@ enum PlayState : int32_t {
 // Link kinds; the number is the "transport" of a device entry.
 enum class Link : int32_t { kUsb = 0, kUsbRole = 1, kBluetooth = 2, kOther = 3 };
 
+struct Chapter {
+    std::string title;
+    int32_t length_ms = 60000;
+};
+
 struct Track {
     std::string title;
     std::string artist;
@@ -37,6 +42,19 @@ struct Track {
     int32_t length_ms = 180000;
     bool audiobook = false;
     bool video = false;
+    int32_t sample_rate = 44100;
+    uint64_t uid = 0;               // persistent identifier; 0: derived from the track's place
+    uint32_t album_color = 0;       // 0xRRGGBB of the album's picture; 0: derived from the album
+    std::vector<Chapter> chapters;  // back to back from 0; empty: no chapters
+    std::vector<int32_t> artwork_times_ms;  // empty: the chapter starts, or 0
+};
+
+// How a device hands out its pictures.
+struct ArtworkSpec {
+    bool shared_file = true;  // false: pixels inline in the reply
+    int32_t width = 240;
+    int32_t height = 240;
+    int32_t pixel_format = 2;  // 2: RGB 5-6-5 little-endian, 3: big-endian
 };
 
 struct PlayerState {
@@ -66,6 +84,7 @@ struct DeviceSpec {
     std::string playing_app = "Music";
     std::vector<Track> tracks;
     PlayerState player;
+    ArtworkSpec artwork;
 };
 
 struct Device {
@@ -78,7 +97,16 @@ struct Device {
     PlayerState player;
     std::map<int32_t, int32_t> preferences;  // class -> value
     const Track *current_track() const;
+    // The track with this persistent identifier, or null.
+    const Track *track_by_uid(uint64_t uid) const;
+    // Chapter of the current track at the current position; -1 without chapters.
+    int32_t current_chapter() const;
 };
+
+// Start of a chapter in its track.
+int32_t chapter_start(const Track &track, int32_t chapter);
+// Chapter at a position; -1 for a track without chapters.
+int32_t chapter_at(const Track &track, int32_t position_ms);
 
 // What the world needs from the program around it.
 class WorldHost {
@@ -137,6 +165,8 @@ class World {
     bool set_track(Device &d, int32_t index);
     bool set_shuffle(Device &d, int32_t mode);
     bool set_repeat(Device &d, int32_t mode);
+    // Moves to the start of a chapter of the current track.
+    bool set_chapter(Device &d, int32_t chapter);
 
     // Playback clock: advances every playing device by elapsed milliseconds and pushes
     // their positions.
@@ -150,6 +180,7 @@ class World {
   private:
     void set_state(Device &d, int32_t state);
     void move_to_track(Device &d, int32_t index);
+    void announce_chapter(Device &d);
 
     std::vector<std::unique_ptr<Device>> devices_;
     WorldHost &host_;
