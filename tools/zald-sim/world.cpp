@@ -42,14 +42,17 @@ World::World(std::vector<DeviceSpec> specs, WorldHost &host) : host_(host) {
         device->extended = spec.extended;
         device->present = spec.present;
         device->preferences = default_preferences();
+        device->accessory.reset(spec.accessory);
         device->spec = std::move(spec);
         devices_.push_back(std::move(device));
     }
 }
 
 void World::start() {
-    for (auto &device : devices_)
+    for (auto &device : devices_) {
         if (device->present && !device->authenticated) authenticate(*device);
+        run_battery(*device);
+    }
 }
 
 std::vector<Device *> World::present() const {

@@ -10,6 +10,7 @@
 #include <string>
 #include <vector>
 
+#include "accessory.h"
 #include "value_util.h"
 
 namespace sim {
@@ -66,6 +67,7 @@ struct DeviceSpec {
     std::string playing_app = "Music";
     std::vector<Track> tracks;
     PlayerState player;
+    AccessorySpec accessory;
 };
 
 struct Device {
@@ -77,6 +79,7 @@ struct Device {
     int32_t sessions = 0;  // clients with a session open on it ("used")
     PlayerState player;
     std::map<int32_t, int32_t> preferences;  // class -> value
+    AccessoryState accessory;
     const Track *current_track() const;
 };
 
@@ -141,6 +144,15 @@ class World {
     // Playback clock: advances every playing device by elapsed milliseconds and pushes
     // their positions.
     void tick(Millis elapsed);
+
+    // Runs action after delay on the program's clock (handlers schedule follow-up events).
+    void after(Millis delay, std::function<void()> action) {
+        host_.after(delay, std::move(action));
+    }
+    // Battery clock of a device (accessory.cpp), and its event.
+    void run_battery(Device &d);
+    void step_battery(Device &d);
+    void announce_battery(Device &d);
 
     void emit(const Device &d, const char *type, ValuePtr data);
     void emit_int(const Device &d, const char *type, int32_t value) {
