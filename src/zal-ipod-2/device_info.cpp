@@ -7,6 +7,7 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "common/log.h"
 #include "zal-ipod-2/command_forms.h"
 #include "zal-ipod-2/device_decoders.h"
 
@@ -95,6 +96,7 @@ char *decode_bt_status(zal_ipod_handle *h, const zal_ipod_reply *reply) {
     gval *hash = zal_reply_hash(h, reply);
     const char *status = zal_hash_string(hash, "current_bt_status");
     char *copy = status != nullptr ? strdup(status) : nullptr;
+    if (status != nullptr && copy == nullptr) ZAL_LOGE("%s: out of memory\n", __func__);
     serialize_free(hash);
     return copy;
 }
