@@ -233,6 +233,34 @@ TEST_F(SimTest, DeviceInformationFollowsTheScenarioAndFaults) {
     EXPECT_EQ(string_at(*battery, "error"), "flat");
 }
 
+TEST_F(SimTest, BatteryDrainsOnItsClockAndStopsEmpty) {
+    ScenarioFile file(
+        R"({"devices": [{"serial": "D1", "battery": {"level": 4, "interval_ms": 50}}]})");
+    start({"-f", file.path()});
+    // The clock may have run before this client connected: the levels seen go down by one
+    // from wherever they were, to 0.
+    int32_t last = -1;
+    while (last != 0) {
+        auto event = client->event("power_battery_state");
+        ASSERT_TRUE(event.has_value()) << "after level " << last;
+        Value payload = event->value();
+        gval *data = serialize_hash_get(payload.get(), "data");
+        ASSERT_NE(data, nullptr);
+        const int32_t level = serialize_get_int(serialize_hash_get(data, "level"));
+        if (last >= 0) {
+            EXPECT_EQ(level, last - 1);
+        }
+        ASSERT_GE(level, 0);
+        EXPECT_EQ(serialize_get_int(serialize_hash_get(data, "state")), 1);  // discharging
+        last = level;
+    }
+    EXPECT_FALSE(client->event("power_battery_state", 300).has_value()) << "nothing below 0";
+    open_session(*client, 0);
+    auto battery = client->call(117);
+    ASSERT_TRUE(battery.has_value());
+    EXPECT_EQ(battery->int_at("level"), 0);
+}
+
 // ---- The client library against the simulator ----
 
 class SimLibraryTest : public SimTest {

@@ -31,6 +31,7 @@ int32_t store_item(zal_ipod_handle *h, const gval *hash) {
     return 1;
 }
 
+// Like the item reply: no flag (an "error" reply among them) is a failure.
 int32_t decode_voiceover_parameter(zal_ipod_handle *h, const zal_ipod_reply *reply) {
     return zal_decode_flagged_int(h, reply, "get_voiceover_parameter", "value");
 }
