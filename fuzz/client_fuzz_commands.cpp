@@ -99,6 +99,48 @@ const Command kCommands[] = {
             free(times);
         }
     },
+    // Accessory input and video out.
+    [](zal_ipod_handle *h) { use(zal_ipod_enter_videooutmode_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_videooutoptions_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_mode_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_launchapplication_sync(h, "app")); },
+    [](zal_ipod_handle *h) { use(zal_ipod_simple_contextbutton_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_rotation_input_sync(h, 1, 2, 3, 4, 5, 6, 7, 8)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_voiceover_event_sync(h, 0, 0, 0, 0, 0, 0, "x")); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_voiceover_parameter_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_current_voiceover_itemproperty_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_current_voiceover_itemproperty_sync(h, 3)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_register_descriptor_sync(h, 1, 2, 3, 4, 5)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_unregister_descriptor_sync(h, 1)); },
+    // Device information.
+    [](zal_ipod_handle *h) { use(zal_ipod_request_lingo_version_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(static_cast<long>(zal_ipod_get_lingo_options_sync(h, 0))); },
+    [](zal_ipod_handle *h) { use(zal_ipod_localization_info_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_current_eqprofile_index_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_num_eqprofiles_sync(h)); },
+    [](zal_ipod_handle *h) {
+        char name[ZAL_EQPROFILE_NAME_SIZE];
+        if (zal_ipod_get_indexed_eqprofile_name_sync(h, 0, name) == 1)
+            use(static_cast<long>(strnlen(name, sizeof name)));
+    },
+    [](zal_ipod_handle *h) {
+        int state = 0, level = 0;
+        use(zal_ipod_get_power_battery_state_sync(h, &state, &level) + state + level);
+    },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_sound_check_state_sync(h)); },
+    [](zal_ipod_handle *h) {
+        char *status = zal_ipod_bt_connection_status_sync(h);
+        use_text(status);
+        free(status);
+    },
+    [](zal_ipod_handle *h) { use(zal_ipod_device_power_source_update_sync(h, 1, 2)); },
+    // Communications and vehicle integration.
+    [](zal_ipod_handle *h) { use(zal_ipod_start_telephony_callstate_information_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_send_eap_datagram_sync(h, 1, "abc", 3)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_send_vehicle_status_update_sync(h, 1, 2, 3, -4, 5)); },
+    [](zal_ipod_handle *h) {
+        use(zal_ipod_send_accessory_wifi_configuration_information(h, "ap", "pw", 1, 2));
+    },
 };
 
 }  // namespace
@@ -228,4 +270,14 @@ void zal_fuzz_read_handle(zal_ipod_handle *h) {
     use(zal_ipod_current_track_artwork_width(h) + zal_ipod_current_track_artwork_height(h) +
         zal_ipod_current_track_artwork_rowstride(h) +
         zal_ipod_current_track_artwork_pixel_format(h));
+    for (int type = -1; type <= 3; ++type) {
+        use(zal_ipod_voiceover_item_current_index(h, type));
+        use(zal_ipod_voiceover_item_last_index(h, type));
+        use_text(zal_ipod_voiceover_item_name(h, type));
+        use_text(zal_ipod_current_localization_info(h, type));
+    }
+    use(zal_ipod_voiceover_item_topleft_x(h) + zal_ipod_voiceover_item_topleft_y(h) +
+        zal_ipod_voiceover_item_bottomright_x(h) + zal_ipod_voiceover_item_bottomright_y(h));
+    use(zal_ipod_get_result_lingo_version_major(h) + zal_ipod_get_result_lingo_version_minor(h));
+    use_text(zal_ipod_get_result_lingo_version(h));
 }

@@ -634,13 +634,310 @@ ZAL_API uint32_t zal_ipod_current_track_artwork_length(zal_ipod_handle *h);
  * Buttons, rotation, HID, VoiceOver and video-out settings.
  * ---------------------------------------------------------------------------------- */
 
+/* Each command has an asynchronous form (the transaction id, 0 when the handle has no ready
+ * session: commands with parameters then log "not ready2 <name>" as a warning) and a _sync
+ * form that waits and returns the daemon's integer, -1 on failure or an "error" reply (whose
+ * text zal_ipod_get_error_message then returns), unless its comment says otherwise. The
+ * numbers are the device protocol's (button masks, rotation fields, HID descriptor fields,
+ * video-out options); the library sends them unchanged. Parameters typed uint8_t and
+ * uint16_t go out as integers 0..255 and 0..65535, never sign-extended. */
+
+/* Switches the device's video output on (ENTER_VIDEOOUTMODE). */
+ZAL_API int zal_ipod_enter_videooutmode(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_enter_videooutmode. */
+ZAL_API int zal_ipod_enter_videooutmode_sync(zal_ipod_handle *h);
+/* Switches the device's video output off (EXIT_VIDEOOUTMODE). */
+ZAL_API int zal_ipod_exit_videooutmode(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_exit_videooutmode. */
+ZAL_API int zal_ipod_exit_videooutmode_sync(zal_ipod_handle *h);
+/* Asks for the video-out options; flag is sent as 1 when non-zero, else 0. */
+ZAL_API int zal_ipod_get_videooutoptions(zal_ipod_handle *h, int flag);
+/* Synchronous form: the options the daemon answers. */
+ZAL_API int zal_ipod_get_videooutoptions_sync(zal_ipod_handle *h, int flag);
+/* Sets the video-out options. */
+ZAL_API int zal_ipod_set_videooutoptions(zal_ipod_handle *h, int options);
+/* Synchronous form of zal_ipod_set_videooutoptions. */
+ZAL_API int zal_ipod_set_videooutoptions_sync(zal_ipod_handle *h, int options);
+/* Sends one navigation input to the device's video-out menu. */
+ZAL_API int zal_ipod_navigate_videoout(zal_ipod_handle *h, int value);
+/* Synchronous form of zal_ipod_navigate_videoout. */
+ZAL_API int zal_ipod_navigate_videoout_sync(zal_ipod_handle *h, int value);
+/* Asks for the device's current mode (GET_MODE). */
+ZAL_API int zal_ipod_get_mode(zal_ipod_handle *h);
+/* Synchronous form: the mode number. */
+ZAL_API int zal_ipod_get_mode_sync(zal_ipod_handle *h);
+/* Tells the device the head unit's state changed (SET_STATECHANGE). */
+ZAL_API int zal_ipod_set_statechange(zal_ipod_handle *h, int state);
+/* Synchronous form of zal_ipod_set_statechange. */
+ZAL_API int zal_ipod_set_statechange_sync(zal_ipod_handle *h, int state);
+/* Asks the device to launch an application (its identifier text; NULL sends ""). */
+ZAL_API int zal_ipod_launchapplication(zal_ipod_handle *h, const char *application);
+/* Synchronous form of zal_ipod_launchapplication. */
+ZAL_API int zal_ipod_launchapplication_sync(zal_ipod_handle *h, const char *application);
+/* Simple button state (a bit mask of pressed buttons; 0 releases them all), one command per
+ * button page: context, video, audio, radio and camera buttons. A press is a mask followed
+ * by 0. */
+ZAL_API int zal_ipod_simple_contextbutton(zal_ipod_handle *h, int value);
+/* Synchronous form of zal_ipod_simple_contextbutton. */
+ZAL_API int zal_ipod_simple_contextbutton_sync(zal_ipod_handle *h, int value);
+/* Video button state (see zal_ipod_simple_contextbutton). */
+ZAL_API int zal_ipod_simple_videobutton(zal_ipod_handle *h, int value);
+/* Synchronous form of zal_ipod_simple_videobutton. */
+ZAL_API int zal_ipod_simple_videobutton_sync(zal_ipod_handle *h, int value);
+/* Audio button state (see zal_ipod_simple_contextbutton). */
+ZAL_API int zal_ipod_simple_audiobutton(zal_ipod_handle *h, int value);
+/* Synchronous form of zal_ipod_simple_audiobutton. */
+ZAL_API int zal_ipod_simple_audiobutton_sync(zal_ipod_handle *h, int value);
+/* Radio button state (see zal_ipod_simple_contextbutton). */
+ZAL_API int zal_ipod_simple_radiobutton(zal_ipod_handle *h, int value);
+/* Synchronous form of zal_ipod_simple_radiobutton. */
+ZAL_API int zal_ipod_simple_radiobutton_sync(zal_ipod_handle *h, int value);
+/* Camera button state (see zal_ipod_simple_contextbutton). */
+ZAL_API int zal_ipod_simple_camerabutton(zal_ipod_handle *h, int value);
+/* Synchronous form of zal_ipod_simple_camerabutton. */
+ZAL_API int zal_ipod_simple_camerabutton_sync(zal_ipod_handle *h, int value);
+/* Tells the device the head unit's video delay. */
+ZAL_API int zal_ipod_set_video_delay(zal_ipod_handle *h, int delay);
+/* Synchronous form of zal_ipod_set_video_delay. */
+ZAL_API int zal_ipod_set_video_delay_sync(zal_ipod_handle *h, int delay);
+/* Tells the device the current the accessory makes available to it. */
+ZAL_API int zal_ipod_set_available_current(zal_ipod_handle *h, int current);
+/* Synchronous form of zal_ipod_set_available_current. */
+ZAL_API int zal_ipod_set_available_current_sync(zal_ipod_handle *h, int current);
+/* Allows or stops the charging of the device's internal battery. */
+ZAL_API int zal_ipod_set_internal_battery_charging_state(zal_ipod_handle *h, int state);
+/* Synchronous form of zal_ipod_set_internal_battery_charging_state. */
+ZAL_API int zal_ipod_set_internal_battery_charging_state_sync(zal_ipod_handle *h, int state);
+/* Rotation input: three 32-bit fields, three 8-bit fields and two 16-bit fields, sent as an
+ * array of eight integers in this order. */
+ZAL_API int zal_ipod_rotation_input(zal_ipod_handle *h, int32_t field0, int32_t field1,
+                                    int32_t field2, uint8_t byte0, uint8_t byte1, uint8_t byte2,
+                                    uint16_t word0, uint16_t word1);
+/* Synchronous form of zal_ipod_rotation_input. */
+ZAL_API int zal_ipod_rotation_input_sync(zal_ipod_handle *h, int32_t field0, int32_t field1,
+                                         int32_t field2, uint8_t byte0, uint8_t byte1,
+                                         uint8_t byte2, uint16_t word0, uint16_t word1);
+/* VoiceOver event: three 32-bit fields, three 8-bit fields and a text (NULL sends ""), sent
+ * as an array of six integers and one string. */
+ZAL_API int zal_ipod_voiceover_event(zal_ipod_handle *h, int32_t field0, int32_t field1,
+                                     int32_t field2, uint8_t byte0, uint8_t byte1, uint8_t byte2,
+                                     const char *text);
+/* Synchronous form of zal_ipod_voiceover_event. */
+ZAL_API int zal_ipod_voiceover_event_sync(zal_ipod_handle *h, int32_t field0, int32_t field1,
+                                          int32_t field2, uint8_t byte0, uint8_t byte1,
+                                          uint8_t byte2, const char *text);
+/* Asks for a VoiceOver parameter (volume, speaking rate, ...). */
+ZAL_API int zal_ipod_get_voiceover_parameter(zal_ipod_handle *h, int parameter);
+/* Synchronous form: the parameter's "value" when the reply's "get_voiceover_parameter" flag
+ * is non-zero, else -1. */
+ZAL_API int zal_ipod_get_voiceover_parameter_sync(zal_ipod_handle *h, int parameter);
+/* Sets a VoiceOver parameter. */
+ZAL_API int zal_ipod_set_voiceover_parameter(zal_ipod_handle *h, int parameter, int value);
+/* Synchronous form of zal_ipod_set_voiceover_parameter. */
+ZAL_API int zal_ipod_set_voiceover_parameter_sync(zal_ipod_handle *h, int parameter, int value);
+/* Asks for one property of the item under the VoiceOver cursor: types 0, 1 and 2 carry an
+ * index pair and a name, type 3 the item's frame. A reply that arrives outside a wait is
+ * decoded into the item record too (before the reply callback runs). */
+ZAL_API int zal_ipod_get_current_voiceover_itemproperty(zal_ipod_handle *h, int type);
+/* Synchronous form: 1 with the reply's type stored in the item record (the other types keep
+ * what they had), -1 when the reply's flag is 0, its type is not 0..3 or no reply came. */
+ZAL_API int zal_ipod_get_current_voiceover_itemproperty_sync(zal_ipod_handle *h, int type);
+/* Sets the VoiceOver context. */
+ZAL_API int zal_ipod_set_voiceover_context(zal_ipod_handle *h, int context);
+/* Synchronous form of zal_ipod_set_voiceover_context. */
+ZAL_API int zal_ipod_set_voiceover_context_sync(zal_ipod_handle *h, int context);
+/* Registers a HID descriptor with the device: three 32-bit and two 8-bit fields, sent as an
+ * array of five integers (the descriptor's bytes are the daemon's business). */
+ZAL_API int zal_ipod_register_descriptor(zal_ipod_handle *h, int32_t field0, int32_t field1,
+                                         int32_t field2, uint8_t byte0, uint8_t byte1);
+/* Synchronous form of zal_ipod_register_descriptor. */
+ZAL_API int zal_ipod_register_descriptor_sync(zal_ipod_handle *h, int32_t field0, int32_t field1,
+                                              int32_t field2, uint8_t byte0, uint8_t byte1);
+/* Sends a HID report: three 32-bit fields, as an array of three integers. */
+ZAL_API int zal_ipod_ipod_hid_report(zal_ipod_handle *h, int32_t field0, int32_t field1,
+                                     int32_t field2);
+/* Synchronous form of zal_ipod_ipod_hid_report. */
+ZAL_API int zal_ipod_ipod_hid_report_sync(zal_ipod_handle *h, int32_t field0, int32_t field1,
+                                          int32_t field2);
+/* Unregisters a HID descriptor; sent as an array holding the one integer. */
+ZAL_API int zal_ipod_unregister_descriptor(zal_ipod_handle *h, int32_t descriptor);
+/* Synchronous form of zal_ipod_unregister_descriptor. */
+ZAL_API int zal_ipod_unregister_descriptor_sync(zal_ipod_handle *h, int32_t descriptor);
+
+/* VoiceOver item record, as the last item property reply left it (0 and "" before any).
+ * type is 0, 1 or 2; another type gives -1 (NULL for the name). */
+/* Current index of the item of this property type (0..65535). */
+ZAL_API int zal_ipod_voiceover_item_current_index(zal_ipod_handle *h, int type);
+/* Last index of the item of this property type (0..65535). */
+ZAL_API int zal_ipod_voiceover_item_last_index(zal_ipod_handle *h, int type);
+/* Name of the item of this property type: a 128-byte buffer owned by the handle, holding at
+ * most 127 characters (a longer name is cut) and always terminated. */
+ZAL_API const char *zal_ipod_voiceover_item_name(zal_ipod_handle *h, int type);
+/* Frame of the item (property type 3), each 0..65535; -1 for a NULL handle. */
+ZAL_API int zal_ipod_voiceover_item_topleft_x(zal_ipod_handle *h);
+/* See zal_ipod_voiceover_item_topleft_x. */
+ZAL_API int zal_ipod_voiceover_item_topleft_y(zal_ipod_handle *h);
+/* See zal_ipod_voiceover_item_topleft_x. */
+ZAL_API int zal_ipod_voiceover_item_bottomright_x(zal_ipod_handle *h);
+/* See zal_ipod_voiceover_item_topleft_x. */
+ZAL_API int zal_ipod_voiceover_item_bottomright_y(zal_ipod_handle *h);
+
 /* ---- Device information ------------------------------------------------------------------
  * Lingo versions and options, localization, equaliser, battery and power.
  * ---------------------------------------------------------------------------------- */
 
+/* Most queries here are answered by a hash with a success flag named like the request
+ * (for example "get_num_eqprofiles") beside the data: their _sync forms return -1, leaving
+ * every output alone, when no reply came, the flag is 0 or missing, or the reply holds
+ * "error" (its text is then kept for zal_ipod_get_error_message). Asynchronous forms return
+ * the transaction id, or 0 when the handle has no ready session (those with a parameter
+ * then log "not ready2 <name>" as a warning). */
+
+/* Size of the caller's buffer for zal_ipod_get_indexed_eqprofile_name_sync. */
+#define ZAL_EQPROFILE_NAME_SIZE 64
+
+/* Asks for the protocol version of a lingo (command group). Writes
+ * "zal_ipod_request_lingo_version, lingo=0x<lingo>" to standard error. A reply that arrives
+ * outside a wait is decoded into the stored version too (before the reply callback). */
+ZAL_API int zal_ipod_request_lingo_version(zal_ipod_handle *h, int lingo);
+/* Synchronous form: 1 with major and minor stored (see zal_ipod_get_result_lingo_version),
+ * -1 on failure ("Requesting lingo version failed!" on standard output when the daemon
+ * answered with the flag 0). Writes its trace lines to standard error. */
+ZAL_API int zal_ipod_request_lingo_version_sync(zal_ipod_handle *h, int lingo);
+/* Asks for the options of a lingo. */
+ZAL_API int zal_ipod_get_lingo_options(zal_ipod_handle *h, int lingo);
+/* Synchronous form: the options, the first 8 bytes of the byte-string reply read most
+ * significant first; 0 when no reply came or it is not a byte string of at least 8 bytes. */
+ZAL_API uint64_t zal_ipod_get_lingo_options_sync(zal_ipod_handle *h, int lingo);
+/* Asks for the localization text of type 0 or 1. A reply that arrives outside a wait is
+ * stored too (before the reply callback). */
+ZAL_API int zal_ipod_localization_info(zal_ipod_handle *h, int type);
+/* Synchronous form: 1 with the text stored under the reply's type (see
+ * zal_ipod_current_localization_info); -1 when no reply came, or the reply's type is not 0 or
+ * 1 or it has no text (nothing is stored then). A text of 64 characters or more is cut to
+ * 63. */
+ZAL_API int zal_ipod_localization_info_sync(zal_ipod_handle *h, int type);
+/* Asks for the index of the current equaliser profile. */
+ZAL_API int zal_ipod_get_current_eqprofile_index(zal_ipod_handle *h);
+/* Synchronous form: the index ("index" of a reply flagged "get_current_eqprofile_index"). */
+ZAL_API int zal_ipod_get_current_eqprofile_index_sync(zal_ipod_handle *h);
+/* Selects an equaliser profile; value is passed through to the device. */
+ZAL_API int zal_ipod_set_current_eqprofile_index(zal_ipod_handle *h, int index, int value);
+/* Synchronous form: the daemon's integer, -1 on failure. */
+ZAL_API int zal_ipod_set_current_eqprofile_index_sync(zal_ipod_handle *h, int index, int value);
+/* Asks for the number of equaliser profiles. */
+ZAL_API int zal_ipod_get_num_eqprofiles(zal_ipod_handle *h);
+/* Synchronous form: the number ("number" of a reply flagged "get_num_eqprofiles"). */
+ZAL_API int zal_ipod_get_num_eqprofiles_sync(zal_ipod_handle *h);
+/* Asks for the name of the equaliser profile at index. */
+ZAL_API int zal_ipod_get_indexed_eqprofile_name(zal_ipod_handle *h, int index);
+/* Synchronous form: 1 with the name copied into name, a buffer of ZAL_EQPROFILE_NAME_SIZE
+ * (64) bytes: exactly 64 bytes are written, the rest after the text filled with NULs. A name
+ * of 64 characters or more fills all 64 bytes and is NOT terminated: read at most 64 bytes
+ * (or pass a 65-byte buffer whose last byte is 0). name may be NULL (nothing is copied). */
+ZAL_API int zal_ipod_get_indexed_eqprofile_name_sync(zal_ipod_handle *h, int index, char *name);
+/* Asks for the device's battery state and level. */
+ZAL_API int zal_ipod_get_power_battery_state(zal_ipod_handle *h);
+/* Synchronous form: 1 with "state" and "level" stored through the pointers (either may be
+ * NULL); on -1 neither is touched. */
+ZAL_API int zal_ipod_get_power_battery_state_sync(zal_ipod_handle *h, int *state, int *level);
+/* Asks for the sound check setting. */
+ZAL_API int zal_ipod_get_sound_check_state(zal_ipod_handle *h);
+/* Synchronous form: the setting ("state" of a reply flagged "get_sound_check_state"). */
+ZAL_API int zal_ipod_get_sound_check_state_sync(zal_ipod_handle *h);
+/* Changes the sound check setting; value is passed through to the device. */
+ZAL_API int zal_ipod_set_sound_check_state(zal_ipod_handle *h, int state, int value);
+/* Synchronous form: the daemon's integer, -1 on failure. */
+ZAL_API int zal_ipod_set_sound_check_state_sync(zal_ipod_handle *h, int state, int value);
+/* Asks for the device's Bluetooth connection status. */
+ZAL_API int zal_ipod_bt_connection_status(zal_ipod_handle *h);
+/* Synchronous form: a copy of the reply's "current_bt_status" text, which the caller
+ * releases with free(); NULL when no reply came or it has no such text. */
+ZAL_API char *zal_ipod_bt_connection_status_sync(zal_ipod_handle *h);
+/* Asks for the device's Wi-Fi connection information; it arrives as a
+ * ZALIPOD_EVENT_WIFI_INFORMATION event. */
+ZAL_API int zal_ipod_request_wifi_connection_info(zal_ipod_handle *h);
+/* Synchronous form: the daemon's integer, -1 on failure. */
+ZAL_API int zal_ipod_request_wifi_connection_info_sync(zal_ipod_handle *h);
+/* Tells the device about the accessory's power source; both numbers are passed through. */
+ZAL_API int zal_ipod_device_power_source_update(zal_ipod_handle *h, int a, int b);
+/* Synchronous form: 0 once the reply came or the wait ended, whatever the reply. */
+ZAL_API int zal_ipod_device_power_source_update_sync(zal_ipod_handle *h, int a, int b);
+/* Asks the device to authenticate the accessory again. */
+ZAL_API int zal_ipod_reauthentication(zal_ipod_handle *h, int value);
+/* Synchronous form: the daemon's integer, -1 on failure. */
+ZAL_API int zal_ipod_reauthentication_sync(zal_ipod_handle *h, int value);
+
+/* Major number of the last lingo version answered (0 before any; -1 for a NULL handle). */
+ZAL_API int zal_ipod_get_result_lingo_version_major(zal_ipod_handle *h);
+/* Minor number of the last lingo version answered (0 before any; -1 for a NULL handle). */
+ZAL_API int zal_ipod_get_result_lingo_version_minor(zal_ipod_handle *h);
+/* "major.minor" of the last lingo version answered, owned by the handle (at most 7
+ * characters; "" before any, and "" when the two numbers do not fit in 7 characters). */
+ZAL_API const char *zal_ipod_get_result_lingo_version(zal_ipod_handle *h);
+/* Localization text of type 0 or 1 (at most 63 characters, "" before any), owned by the
+ * handle; NULL for another type. */
+ZAL_API const char *zal_ipod_current_localization_info(zal_ipod_handle *h, int type);
+
 /* ---- Communications and vehicle integration ----------------------------------------------
  * Telephony, external accessory datagrams, location, vehicle status and Wi-Fi.
  * ---------------------------------------------------------------------------------- */
+
+/* Asynchronous forms return the transaction id, or 0 when the handle has no ready session
+ * (those with a parameter then log "not ready2 <name>" as a warning); _sync forms return the
+ * daemon's integer, -1 when no reply came or it was not an integer (an "error" reply's text
+ * is kept for zal_ipod_get_error_message). What the device sends back arrives as events:
+ * ZALIPOD_EVENT_TELEPHONY_CALLSTATE_INFORMATION, _TELEPHONY_UPDATE, _EAP_DATAGRAM,
+ * _LOCATION_INFORMATION, _VEHICLE_STATUS_UPDATE and _WIFI_INFORMATION. */
+
+/* Starts the device's call state reports; value is passed through. */
+ZAL_API int zal_ipod_start_telephony_callstate_information(zal_ipod_handle *h, int value);
+/* Synchronous form of zal_ipod_start_telephony_callstate_information. */
+ZAL_API int zal_ipod_start_telephony_callstate_information_sync(zal_ipod_handle *h, int value);
+/* Stops the call state reports. */
+ZAL_API int zal_ipod_stop_telephony_callstate_information(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_stop_telephony_callstate_information. */
+ZAL_API int zal_ipod_stop_telephony_callstate_information_sync(zal_ipod_handle *h);
+/* Starts the device's telephony status reports (signal, carrier, call counts, ...). */
+ZAL_API int zal_ipod_start_telephony_update(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_start_telephony_update. */
+ZAL_API int zal_ipod_start_telephony_update_sync(zal_ipod_handle *h);
+/* Stops the telephony status reports. */
+ZAL_API int zal_ipod_stop_telephony_update(zal_ipod_handle *h);
+/* Synchronous form of zal_ipod_stop_telephony_update. */
+ZAL_API int zal_ipod_stop_telephony_update_sync(zal_ipod_handle *h);
+/* Sends an EAP datagram to the application of session_id: [session_id, length, the length
+ * bytes at data]. A negative length, or a NULL data with a positive length, sends nothing
+ * (0, with an error logged). The transaction id also goes to the slot of identifier-list
+ * requests: a reply that arrives outside a wait reaches the reply callback as 1. */
+ZAL_API int zal_ipod_send_eap_datagram(zal_ipod_handle *h, int session_id, const void *data,
+                                       int length);
+/* Synchronous form of zal_ipod_send_eap_datagram. */
+ZAL_API int zal_ipod_send_eap_datagram_sync(zal_ipod_handle *h, int session_id, const void *data,
+                                            int length);
+/* Answers the device's location request with location data text (NULL sends ""). */
+ZAL_API int zal_ipod_send_location_information(zal_ipod_handle *h, const char *text);
+/* Synchronous form of zal_ipod_send_location_information. */
+ZAL_API int zal_ipod_send_location_information_sync(zal_ipod_handle *h, const char *text);
+/* Tells the device the state of the head unit's Bluetooth component. */
+ZAL_API int zal_ipod_send_bluetooth_component_information(zal_ipod_handle *h, int state);
+/* Synchronous form of zal_ipod_send_bluetooth_component_information. */
+ZAL_API int zal_ipod_send_bluetooth_component_information_sync(zal_ipod_handle *h, int state);
+/* Answers the device's vehicle status request: five integers in this order, d keeping its
+ * sign (-40 goes as -40) and e taken as unsigned (200 goes as 200). */
+ZAL_API int zal_ipod_send_vehicle_status_update(zal_ipod_handle *h, int a, int b, int c, int16_t d,
+                                                uint8_t e);
+/* Synchronous form of zal_ipod_send_vehicle_status_update. */
+ZAL_API int zal_ipod_send_vehicle_status_update_sync(zal_ipod_handle *h, int a, int b, int c,
+                                                     int16_t d, uint8_t e);
+/* Hands the device the head unit's Wi-Fi access point: [ssid, passphrase, first_value,
+ * second_value] (NULL texts send ""). Sent on any connected handle, without a session too;
+ * returns the transaction id. There is no _sync form: the reply is not decoded. */
+ZAL_API int zal_ipod_send_accessory_wifi_configuration_information(zal_ipod_handle *h,
+                                                                   const char *ssid,
+                                                                   const char *passphrase,
+                                                                   uint16_t first_value,
+                                                                   uint16_t second_value);
 
 /* ---- iAP1 database browsing --------------------------------------------------------------
  * Categories, records and track records of older devices.

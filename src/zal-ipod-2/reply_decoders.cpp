@@ -3,6 +3,7 @@
 #include "zal-ipod-2/reply_decoders.h"
 
 #include "zal-ipod-2/command.h"
+#include "zal-ipod-2/device_decoders.h"
 #include "zal-ipod-2/devices.h"
 #include "zal-ipod-2/playback_state.h"
 
@@ -48,9 +49,9 @@ constexpr zal_reply_decoder_row kDecoders[] = {
     {&S::db_track_info_tid, nullptr, false},
     {&S::pb_track_info_tid, nullptr, false},
     {&S::uid_list_tid, decode_uid_list, false},
-    {&S::lingo_version_tid, nullptr, false},
-    {&S::localization_tid, nullptr, false},
-    {&S::voiceover_item_tid, nullptr, false},
+    {&S::lingo_version_tid, zal_lingo_version_decode, false},
+    {&S::localization_tid, zal_localization_decode, false},
+    {&S::voiceover_item_tid, zal_voiceover_item_decode, false},
 };
 
 constexpr zal_reply_adjuster_row kAdjusters[] = {

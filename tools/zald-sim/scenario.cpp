@@ -225,6 +225,38 @@ PlayerState read_playback(const Source &src, const json &j, const std::string &p
     return p;
 }
 
+// A list of 1..max texts of 1..63 characters each.
+std::vector<std::string> read_texts(Reader &r, const char *key, std::vector<std::string> fallback,
+                                    size_t min_count, size_t max_count) {
+    const json *list = r.array(key);
+    if (list == nullptr) return fallback;
+    if (list->size() < min_count || list->size() > max_count)
+        r.source().fail(r.place(key), "expected " + std::to_string(min_count) + " to " +
+                                          std::to_string(max_count) + " texts");
+    std::vector<std::string> texts;
+    for (size_t i = 0; i < list->size(); ++i) {
+        const json &item = (*list)[i];
+        const std::string place = item_place(r.place(key), i);
+        if (!item.is_string())
+            r.source().fail(place, std::string("expected a string, found ") + kind_name(item));
+        texts.push_back(item.get<std::string>());
+        if (texts.back().empty() || texts.back().size() > 63)
+            r.source().fail(place, "a text needs 1 to 63 characters");
+    }
+    return texts;
+}
+
+void read_accessory(Reader &r, AccessorySpec &a) {
+    if (r.has("battery")) {
+        Reader battery(r.source(), r.raw("battery"), r.place("battery"));
+        a.battery_level = static_cast<int32_t>(battery.integer("level", 80, 0, 100));
+        a.battery_interval_ms = battery.integer("interval_ms", 10000, 10, 3600000);
+        battery.finish();
+    }
+    a.eq_profiles = read_texts(r, "eq_profiles", a.eq_profiles, 1, 64);
+    a.localization = read_texts(r, "localization", a.localization, 2, 2);
+}
+
 DeviceSpec read_device(const Source &src, const json &j, const std::string &place) {
     Reader r(src, j, place);
     DeviceSpec d;
@@ -252,6 +284,7 @@ DeviceSpec read_device(const Source &src, const json &j, const std::string &plac
     if (r.has("playback"))
         d.player = read_playback(src, r.raw("playback"), r.place("playback"), d.tracks);
     if (r.has("artwork")) d.artwork = read_artwork(src, r.raw("artwork"), r.place("artwork"));
+    read_accessory(r, d.accessory);
     r.finish();
     return d;
 }

@@ -70,6 +70,7 @@ World::World(std::vector<DeviceSpec> specs, WorldHost &host) : host_(host) {
         device->extended = spec.extended;
         device->present = spec.present;
         device->preferences = default_preferences();
+        device->accessory.reset(spec.accessory);
         device->spec = std::move(spec);
         // Identifiers nobody gave: the device number in the high half, the place below.
         for (size_t i = 0; i < device->spec.tracks.size(); ++i) {
@@ -81,8 +82,10 @@ World::World(std::vector<DeviceSpec> specs, WorldHost &host) : host_(host) {
 }
 
 void World::start() {
-    for (auto &device : devices_)
+    for (auto &device : devices_) {
         if (device->present && !device->authenticated) authenticate(*device);
+        run_battery(*device);
+    }
 }
 
 std::vector<Device *> World::present() const {

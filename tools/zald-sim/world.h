@@ -10,6 +10,7 @@
 #include <string>
 #include <vector>
 
+#include "accessory.h"
 #include "value_util.h"
 
 namespace sim {
@@ -85,6 +86,7 @@ struct DeviceSpec {
     std::vector<Track> tracks;
     PlayerState player;
     ArtworkSpec artwork;
+    AccessorySpec accessory;
 };
 
 struct Device {
@@ -96,6 +98,7 @@ struct Device {
     int32_t sessions = 0;  // clients with a session open on it ("used")
     PlayerState player;
     std::map<int32_t, int32_t> preferences;  // class -> value
+    AccessoryState accessory;
     const Track *current_track() const;
     // The track with this persistent identifier, or null.
     const Track *track_by_uid(uint64_t uid) const;
@@ -171,6 +174,15 @@ class World {
     // Playback clock: advances every playing device by elapsed milliseconds and pushes
     // their positions.
     void tick(Millis elapsed);
+
+    // Runs action after delay on the program's clock (handlers schedule follow-up events).
+    void after(Millis delay, std::function<void()> action) {
+        host_.after(delay, std::move(action));
+    }
+    // Battery clock of a device (accessory.cpp), and its event.
+    void run_battery(Device &d);
+    void step_battery(Device &d);
+    void announce_battery(Device &d);
 
     void emit(const Device &d, const char *type, ValuePtr data);
     void emit_int(const Device &d, const char *type, int32_t value) {
