@@ -42,6 +42,9 @@ gval *zal_arg_string(const char *s) {
 gval *zal_arg_bytes(const void *p, uint32_t n) {
     return serialize_bytes(p, n);
 }
+gval *zal_arg_struct(const void *p, uint32_t n) {
+    return serialize_struct(p, n);
+}
 
 gval *zal_arg_ints(std::initializer_list<int32_t> items) {
     gval *array = serialize_array_reserve(static_cast<uint32_t>(items.size()));

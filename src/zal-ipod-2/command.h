@@ -38,6 +38,8 @@ gval *zal_arg_int(int32_t v);
 gval *zal_arg_bool(int v);
 gval *zal_arg_string(const char *s);
 gval *zal_arg_bytes(const void *p, uint32_t n);
+// Opaque record sent as one struct value (fixed-layout records).
+gval *zal_arg_struct(const void *p, uint32_t n);
 // Array of integers, in parameter order (narrow parameters widened without sign first).
 gval *zal_arg_ints(std::initializer_list<int32_t> items);
 // Array of already built items (owned); nullptr and every item freed if one is nullptr.

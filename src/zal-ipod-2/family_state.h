@@ -6,12 +6,6 @@
 
 #include <cstdint>
 
-// iAP1 database browsing: record counts and results of the last category requests.
-struct zal_records_state {
-    int32_t record_count = 0;
-    void reset() {}
-};
-
 // Artwork of the current track (buffer, mapped file, geometry).
 struct zal_artwork_state {
     void reset() {}

@@ -11,6 +11,7 @@
 
 #include "zal-ipod-2/zal-ipod-2.h"
 #include "zal-ipod-2/family_state.h"
+#include "zal-ipod-2/media_db_state.h"
 #include "zal-ipod-2/playback_state.h"
 
 // Transaction ids of the last request of each kind whose reply needs a decoder of its own.
