@@ -20,6 +20,7 @@ HandlerTable make_handler_table() {
     register_core_handlers(table);
     register_transport_handlers(table);
     register_playback_handlers(table);
+    register_media_handlers(table);
     return table;
 }
 

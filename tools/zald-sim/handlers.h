@@ -55,5 +55,6 @@ HandlerTable make_handler_table();
 void register_core_handlers(HandlerTable &table);
 void register_transport_handlers(HandlerTable &table);
 void register_playback_handlers(HandlerTable &table);
+void register_media_handlers(HandlerTable &table);
 
 }  // namespace sim

@@ -10,6 +10,7 @@
 #include <string>
 #include <vector>
 
+#include "media_library.h"
 #include "value_util.h"
 
 namespace sim {
@@ -37,6 +38,7 @@ struct Track {
     int32_t length_ms = 180000;
     bool audiobook = false;
     bool video = false;
+    uint64_t uid = 0;  // persistent identifier in the device's media library (0: none)
 };
 
 struct PlayerState {
@@ -64,8 +66,12 @@ struct DeviceSpec {
     Millis auth_delay_ms = 300;  // from arrival to the authentication outcome
     bool auth_succeeds = true;
     std::string playing_app = "Music";
-    std::vector<Track> tracks;
+    std::vector<Track> tracks;  // the play queue
     PlayerState player;
+    // The media library (its changes over time included); a generated one when the
+    // scenario gives none. The queue's tracks are part of it.
+    MediaLibrary library;
+    std::vector<TimedLibraryChange> library_changes;
 };
 
 struct Device {
@@ -77,6 +83,7 @@ struct Device {
     int32_t sessions = 0;  // clients with a session open on it ("used")
     PlayerState player;
     std::map<int32_t, int32_t> preferences;  // class -> value
+    MediaSession media;
     const Track *current_track() const;
 };
 
@@ -137,6 +144,8 @@ class World {
     bool set_track(Device &d, int32_t index);
     bool set_shuffle(Device &d, int32_t mode);
     bool set_repeat(Device &d, int32_t mode);
+    // Replaces the play queue by library tracks and plays from start (index in the queue).
+    void play_queue(Device &d, const std::vector<const LibraryTrack *> &queue, int32_t start);
 
     // Playback clock: advances every playing device by elapsed milliseconds and pushes
     // their positions.
@@ -154,5 +163,9 @@ class World {
     std::vector<std::unique_ptr<Device>> devices_;
     WorldHost &host_;
 };
+
+// Pushes the library changes a device's update stream has not carried yet
+// (handlers_media.cpp); nothing while the stream is stopped.
+void push_library_updates(World &world, Device &device);
 
 }  // namespace sim
