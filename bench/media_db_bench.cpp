@@ -28,10 +28,12 @@ std::vector<unsigned char> encoded_reply() {
         serialize_array_add(reply, serialize_string(("Artist " + std::to_string(i / 40)).c_str()));
         serialize_array_add(reply, serialize_string(("Album " + std::to_string(i / 10)).c_str()));
         serialize_array_add(reply, serialize_string("Electronic"));
-        serialize_array_add(reply, serialize_string(("Composer " + std::to_string(i % 13)).c_str()));
+        serialize_array_add(reply,
+                            serialize_string(("Composer " + std::to_string(i % 13)).c_str()));
         serialize_array_add(reply, serialize_int(180000 + i));
         unsigned char uid[8];
-        for (int b = 0; b < 8; ++b) uid[b] = static_cast<unsigned char>((0x5100000000000000ull + i) >> (56 - 8 * b));
+        for (int b = 0; b < 8; ++b)
+            uid[b] = static_cast<unsigned char>((0x5100000000000000ull + i) >> (56 - 8 * b));
         serialize_array_add(reply, serialize_bytes(uid, 8));
     }
     uint32_t length = 0;

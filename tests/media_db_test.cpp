@@ -73,15 +73,24 @@ using S = zal_pending_slots;
 
 const WireCase kWire[] = {
     {"set_hierarchy", ZAL_OP_SET_HIERARCHY, [] { return serialize_int(1); },
-     [] { return serialize_int(0); }, [](zal_ipod_handle *h) { return zal_ipod_set_hierarchy_sync(h, 1); },
-     0, nullptr, [](zal_ipod_handle *h) { return zal_ipod_set_hierarchy(h, 1); }},
+     [] { return serialize_int(0); },
+     [](zal_ipod_handle *h) { return zal_ipod_set_hierarchy_sync(h, 1); }, 0, nullptr,
+     [](zal_ipod_handle *h) { return zal_ipod_set_hierarchy(h, 1); }},
     {"set_category", ZAL_OP_SET_CATEGORY, [] { return serialize_int(3); },
-     [] { return serialize_int(42); }, [](zal_ipod_handle *h) { return zal_ipod_set_category_sync(h, 3); },
-     42, &S::category_tid, [](zal_ipod_handle *h) { return zal_ipod_set_category(h, 3); }},
-    {"select_db", ZAL_OP_SELECT_DB, [] { return ints({7, 2}); }, [] { return serialize_int(9); },
+     [] { return serialize_int(42); },
+     [](zal_ipod_handle *h) { return zal_ipod_set_category_sync(h, 3); }, 42, &S::category_tid,
+     [](zal_ipod_handle *h) { return zal_ipod_set_category(h, 3); }},
+    {"select_db", ZAL_OP_SELECT_DB,
+     [] {
+         return ints({7, 2});
+     },
+     [] { return serialize_int(9); },
      [](zal_ipod_handle *h) { return zal_ipod_select_db_sync(h, 7, 2); }, 9, &S::select_db_tid,
      [](zal_ipod_handle *h) { return zal_ipod_select_db(h, 7, 2); }},
-    {"get_records", ZAL_OP_GET_DB_RECORDS, [] { return ints({10, 2}); },
+    {"get_records", ZAL_OP_GET_DB_RECORDS,
+     [] {
+         return ints({10, 2});
+     },
      [] {
          gval *a = ints({0, 1, 10, 2});
          serialize_array_add(a, serialize_string("A"));
@@ -91,25 +100,40 @@ const WireCase kWire[] = {
      [](zal_ipod_handle *h) { return zal_ipod_get_records_sync(h, 10, 2); }, 1, &S::records_tid,
      [](zal_ipod_handle *h) { return zal_ipod_get_records(h, 10, 2); }},
     {"indexed_track_info", ZAL_OP_INDEXED_TRACK_INFO, [] { return serialize_int(4); },
-     [] { return hash_of({{"indexed_track_info", serialize_int(1)}}); },
+     [] {
+         return hash_of({{"indexed_track_info", serialize_int(1)}});
+     },
      [](zal_ipod_handle *h) { return zal_ipod_indexed_track_info_sync(h, 4); }, 1,
-     &S::indexed_track_info_tid, [](zal_ipod_handle *h) { return zal_ipod_indexed_track_info(h, 4); }},
+     &S::indexed_track_info_tid,
+     [](zal_ipod_handle *h) { return zal_ipod_indexed_track_info(h, 4); }},
     {"itunes_info", ZAL_OP_GET_DB_ITUNES_INFO, [] { return serialize_int(2); },
-     [] { return hash_of({{"type", serialize_int(2)}, {"count", serialize_int(5)}}); },
+     [] {
+         return hash_of({{"type", serialize_int(2)}, {"count", serialize_int(5)}});
+     },
      [](zal_ipod_handle *h) { return zal_ipod_get_db_itunes_info_sync(h, 2); }, 1,
      &S::itunes_info_tid, [](zal_ipod_handle *h) { return zal_ipod_get_db_itunes_info(h, 2); }},
-    {"db_track_info", ZAL_OP_GET_DB_TRACK_INFO, [] { return ints({0, 3, 1}); },
+    {"db_track_info", ZAL_OP_GET_DB_TRACK_INFO,
+     [] {
+         return ints({0, 3, 1});
+     },
      [] {
          gval *a = ints({3});
          serialize_array_add(a, uid_bytes(1));
          return a;
      },
      [](zal_ipod_handle *h) { return zal_ipod_get_db_track_info_sync(h, 0, 3, 1); }, 1,
-     &S::db_track_info_tid, [](zal_ipod_handle *h) { return zal_ipod_get_db_track_info(h, 0, 3, 1); }},
-    {"pb_track_info", ZAL_OP_GET_PB_TRACK_INFO, [] { return ints({5, 1, 0}); },
-     [] { return hash_of({{"error", serialize_string("no queue")}}); },
+     &S::db_track_info_tid,
+     [](zal_ipod_handle *h) { return zal_ipod_get_db_track_info(h, 0, 3, 1); }},
+    {"pb_track_info", ZAL_OP_GET_PB_TRACK_INFO,
+     [] {
+         return ints({5, 1, 0});
+     },
+     [] {
+         return hash_of({{"error", serialize_string("no queue")}});
+     },
      [](zal_ipod_handle *h) { return zal_ipod_get_pb_track_info_sync(h, 5, 1, 0); }, -1,
-     &S::pb_track_info_tid, [](zal_ipod_handle *h) { return zal_ipod_get_pb_track_info(h, 5, 1, 0); }},
+     &S::pb_track_info_tid,
+     [](zal_ipod_handle *h) { return zal_ipod_get_pb_track_info(h, 5, 1, 0); }},
 };
 
 class MediaDbWire : public ::testing::TestWithParam<WireCase> {};
@@ -209,21 +233,30 @@ struct RecordsCase {
 
 const RecordsCase kRecords[] = {
     {"valid_range",
-     [] { return records_reply(1, 10, 2, {serialize_string("Alpha"), serialize_string("Beta")}); },
+     [] {
+         return records_reply(1, 10, 2, {serialize_string("Alpha"), serialize_string("Beta")});
+     },
      1,
      {{9, ""}, {10, "Alpha"}, {11, "Beta"}, {12, ""}}},
-    {"invalid_cache", [] { return records_reply(0, 0, 1, {serialize_string("Alpha")}); }, 0,
+    {"invalid_cache",
+     [] { return records_reply(0, 0, 1, {serialize_string("Alpha")}); },
+     0,
      {{0, ""}}},
     // The count claims more names than the array holds: no read past the array.
-    {"count_beyond_array", [] { return records_reply(1, 0, 1000, {serialize_string("Only")}); },
+    {"count_beyond_array",
+     [] { return records_reply(1, 0, 1000, {serialize_string("Only")}); },
      1,
      {{0, "Only"}, {1, ""}, {999, ""}}},
     // A name that is not a string is not handed out.
-    {"name_not_a_string", [] { return records_reply(1, 0, 2, {serialize_int(5), serialize_string("B")}); },
+    {"name_not_a_string",
+     [] {
+         return records_reply(1, 0, 2, {serialize_int(5), serialize_string("B")});
+     },
      1,
      {{0, ""}, {1, "B"}}},
     {"offset_near_int_max",
-     [] { return records_reply(1, INT_MAX - 1, INT_MAX, {serialize_string("Edge")}); }, 1,
+     [] { return records_reply(1, INT_MAX - 1, INT_MAX, {serialize_string("Edge")}); },
+     1,
      {{INT_MAX - 1, "Edge"}, {INT_MAX, ""}, {INT_MIN, ""}}},
     {"too_short_for_a_flag", [] { return ints({0}); }, 0, {{0, ""}}},
 };
@@ -234,7 +267,8 @@ TEST_P(RecordsDecoding, CacheAnswersOnlyWhatItHolds) {
     const RecordsCase &c = GetParam();
     zal_ipod_handle *h = offline_handle();
     EXPECT_EQ(decode_with(h, zal_records_decode, c.reply()), c.result);
-    for (const RecordRead &r : c.reads) EXPECT_STREQ(zal_ipod_record(h, r.index), r.name) << r.index;
+    for (const RecordRead &r : c.reads)
+        EXPECT_STREQ(zal_ipod_record(h, r.index), r.name) << r.index;
     zal_ipod_close(h);
 }
 
@@ -244,7 +278,8 @@ INSTANTIATE_TEST_SUITE_P(Shapes, RecordsDecoding, ::testing::ValuesIn(kRecords),
 TEST(RecordsDecodingRules, NonArrayKeepsTheCacheAndNoReplyFails) {
     zal_ipod_handle *h = offline_handle();
     EXPECT_STREQ(zal_ipod_record(h, 0), "");  // no cache yet
-    ASSERT_EQ(decode_with(h, zal_records_decode, records_reply(1, 0, 1, {serialize_string("Kept")})), 1);
+    ASSERT_EQ(
+        decode_with(h, zal_records_decode, records_reply(1, 0, 1, {serialize_string("Kept")})), 1);
     EXPECT_EQ(decode_with(h, zal_records_decode, hash_of({{"error", serialize_string("x")}})), 1);
     EXPECT_EQ(decode_with(h, zal_records_decode, serialize_string("odd")), 1);
     EXPECT_EQ(decode_with(h, zal_records_decode, nullptr), -1);
@@ -259,15 +294,16 @@ struct TrackInfoCase {
     const char *name;
     std::function<gval *()> reply;  // the whole reply, element 0 included
     int32_t result;
-    int count;                      // tracks in the kept result
-    std::vector<int> names_present; // tracks whose name accessor answers
-    std::vector<int> uid_ok;        // tracks whose identifier accessor returns 1
-    std::vector<int> uid_set_not_ok;// tracks with a byte string of another length
+    int count;                        // tracks in the kept result
+    std::vector<int> names_present;   // tracks whose name accessor answers
+    std::vector<int> uid_ok;          // tracks whose identifier accessor returns 1
+    std::vector<int> uid_set_not_ok;  // tracks with a byte string of another length
 };
 
 gval *full_reply(int tracks, int extra_elements) {
     gval *a = ints({tracks});
-    for (int i = 0; i < tracks; ++i) add_track(a, i, "T" + std::to_string(i), 1000 * i, uint8_t(i * 8));
+    for (int i = 0; i < tracks; ++i)
+        add_track(a, i, "T" + std::to_string(i), 1000 * i, uint8_t(i * 8));
     for (int i = 0; i < extra_elements; ++i) serialize_array_add(a, serialize_int(i));
     return a;
 }
@@ -283,7 +319,11 @@ const TrackInfoCase kTrackInfo[] = {
          serialize_array_add(a, uid_bytes(17));
          return a;
      },
-     1, 3, {}, {0, 2}, {1}},
+     1,
+     3,
+     {},
+     {0, 2},
+     {1}},
     {"empty_after_the_head", [] { return ints({0}); }, 1, 0, {}, {}, {}},
     {"empty_reply_array", [] { return serialize_array(); }, 1, 0, {}, {}, {}},
     {"full_with_mistyped_fields",
@@ -296,7 +336,11 @@ const TrackInfoCase kTrackInfo[] = {
          serialize_array_add(a, serialize_string("not bytes"));
          return a;
      },
-     1, 1, {}, {}, {}},
+     1,
+     1,
+     {},
+     {},
+     {}},
     {"full_with_long_identifier",
      [] {
          gval *a = ints({1});
@@ -306,7 +350,11 @@ const TrackInfoCase kTrackInfo[] = {
          serialize_array_add(a, uid_bytes(1, 9));
          return a;
      },
-     1, 1, {0}, {}, {0}},
+     1,
+     1,
+     {0},
+     {},
+     {0}},
 };
 
 class TrackInfoDecoding : public ::testing::TestWithParam<TrackInfoCase> {};
@@ -321,8 +369,8 @@ TEST_P(TrackInfoDecoding, ResultCountsAndAccessorsFollowTheLayout) {
     for (int i = -1; i <= c.count + 1; ++i) {
         SCOPED_TRACE(i);
         const char *name = "untouched";
-        const bool has_name = std::find(c.names_present.begin(), c.names_present.end(), i) !=
-                              c.names_present.end();
+        const bool has_name =
+            std::find(c.names_present.begin(), c.names_present.end(), i) != c.names_present.end();
         EXPECT_EQ(zal_ipod_get_result_db_track_info_name(r, i, &name), has_name ? 1 : 0);
         if (!has_name) {
             EXPECT_STREQ(name, "untouched");
@@ -345,7 +393,9 @@ TEST(TrackInfoDecodingRules, FailuresKeepThePreviousResult) {
     zal_ipod_handle *h = offline_handle();
     ASSERT_EQ(decode_with(h, zal_pb_track_info_decode, full_reply(1, 0)), 1);
     const gval *before = zal_ipod_get_result_pb_track_info(h);
-    EXPECT_EQ(decode_with(h, zal_pb_track_info_decode, hash_of({{"error", serialize_string("busy")}})), -1);
+    EXPECT_EQ(
+        decode_with(h, zal_pb_track_info_decode, hash_of({{"error", serialize_string("busy")}})),
+        -1);
     EXPECT_STREQ(zal_ipod_get_error_message(h), "busy");
     EXPECT_EQ(decode_with(h, zal_pb_track_info_decode, serialize_int(3)), -1);
     EXPECT_EQ(decode_with(h, zal_pb_track_info_decode, nullptr), -1);
@@ -401,7 +451,7 @@ TEST(TrackInfoProperty, AccessorsAnswerAsTheRecordsSay) {
         const int elements = identifiers ? tracks : tracks * 8 + tail;
         for (int e = 0; e < elements; ++e) {
             const int field = e % 8;
-            int kind = identifiers || field == 7 ? SERIALIZE_BYTES
+            int kind = identifiers || field == 7  ? SERIALIZE_BYTES
                        : field == 0 || field == 6 ? SERIALIZE_INT
                                                   : SERIALIZE_STRING;
             if (pick(10) == 0) kind = (kind == SERIALIZE_INT) ? SERIALIZE_STRING : SERIALIZE_INT;
@@ -411,7 +461,8 @@ TEST(TrackInfoProperty, AccessorsAnswerAsTheRecordsSay) {
             if (kind == SERIALIZE_INT) {
                 v = serialize_int(el.number);
             } else if (kind == SERIALIZE_STRING) {
-                el.bytes.assign(static_cast<size_t>(pick(3) == 0 ? pick(600) : pick(12)), 'a' + char(pick(26)));
+                el.bytes.assign(static_cast<size_t>(pick(3) == 0 ? pick(600) : pick(12)),
+                                'a' + char(pick(26)));
                 v = serialize_string(el.bytes.c_str());
             } else {
                 const int length = pick(3) == 0 ? pick(17) : 8;
@@ -465,8 +516,9 @@ TEST(TrackInfoProperty, AccessorsAnswerAsTheRecordsSay) {
                     EXPECT_EQ(text, nullptr);
                 }
             }
-            const Element *u = id_layout ? (i >= 0 && i < count ? &model[static_cast<size_t>(i)] : nullptr)
-                                         : el(7);
+            const Element *u =
+                id_layout ? (i >= 0 && i < count ? &model[static_cast<size_t>(i)] : nullptr)
+                          : el(7);
             const uint8_t *uid = nullptr;
             const bool is_bytes = u && u->kind == SERIALIZE_BYTES;
             EXPECT_EQ(zal_ipod_get_result_db_track_info_uid(r, i, &uid),
@@ -494,22 +546,52 @@ struct ItunesCase {
 const uint8_t kOldUid[8] = {0xee, 0xee, 0xee, 0xee, 0xee, 0xee, 0xee, 0xee};
 
 const ItunesCase kItunes[] = {
-    {"uid", [] { return hash_of({{"type", serialize_int(0)}, {"uid", uid_bytes(1)}}); }, 1, true,
-     false, 77},
-    {"uid_longer_copies_eight", [] { return hash_of({{"type", serialize_int(0)}, {"uid", uid_bytes(1, 12)}}); },
+    {"uid",
+     [] {
+         return hash_of({{"type", serialize_int(0)}, {"uid", uid_bytes(1)}});
+     },
      1, true, false, 77},
-    {"last_sync", [] { return hash_of({{"type", serialize_int(1)}, {"last_sync", uid_bytes(1, 7)}}); }, 1,
-     false, true, 77},
-    {"count", [] { return hash_of({{"type", serialize_int(2)}, {"count", serialize_int(1234)}}); }, 1,
-     false, false, 1234},
-    {"short_uid", [] { return hash_of({{"type", serialize_int(0)}, {"uid", uid_bytes(1, 5)}}); }, -1,
-     false, false, 77},
-    {"uid_as_text", [] { return hash_of({{"type", serialize_int(0)}, {"uid", serialize_string("12345678")}}); },
+    {"uid_longer_copies_eight",
+     [] {
+         return hash_of({{"type", serialize_int(0)}, {"uid", uid_bytes(1, 12)}});
+     },
+     1, true, false, 77},
+    {"last_sync",
+     [] {
+         return hash_of({{"type", serialize_int(1)}, {"last_sync", uid_bytes(1, 7)}});
+     },
+     1, false, true, 77},
+    {"count",
+     [] {
+         return hash_of({{"type", serialize_int(2)}, {"count", serialize_int(1234)}});
+     },
+     1, false, false, 1234},
+    {"short_uid",
+     [] {
+         return hash_of({{"type", serialize_int(0)}, {"uid", uid_bytes(1, 5)}});
+     },
      -1, false, false, 77},
-    {"short_last_sync", [] { return hash_of({{"type", serialize_int(1)}, {"last_sync", uid_bytes(1, 6)}}); },
+    {"uid_as_text",
+     [] {
+         return hash_of({{"type", serialize_int(0)}, {"uid", serialize_string("12345678")}});
+     },
      -1, false, false, 77},
-    {"count_missing", [] { return hash_of({{"type", serialize_int(3)}}); }, -1, false, false, 77},
-    {"error", [] { return hash_of({{"error", serialize_string("no db")}, {"type", serialize_int(2)}, {"count", serialize_int(1)}}); },
+    {"short_last_sync",
+     [] {
+         return hash_of({{"type", serialize_int(1)}, {"last_sync", uid_bytes(1, 6)}});
+     },
+     -1, false, false, 77},
+    {"count_missing",
+     [] {
+         return hash_of({{"type", serialize_int(3)}});
+     },
+     -1, false, false, 77},
+    {"error",
+     [] {
+         return hash_of({{"error", serialize_string("no db")},
+                         {"type", serialize_int(2)},
+                         {"count", serialize_int(1)}});
+     },
      -1, false, false, 77},
     {"not_a_hash", [] { return serialize_int(0); }, -1, false, false, 77},
 };

@@ -35,14 +35,16 @@ struct LibraryView {
     int last_progress = 0;
     std::map<uint64_t, std::string> titles;
     std::vector<uint64_t> deleted;
-    std::map<std::string, std::pair<uint64_t, std::vector<uint64_t>>> playlists;  // name -> id, items
+    std::map<std::string, std::pair<uint64_t, std::vector<uint64_t>>>
+        playlists;  // name -> id, items
 };
 
 int collect_update(zal_ipod_handle *, zal_ipod_event *e, void *user) {
     if (e->kind != ZALIPOD_EVENT_MEDIALIBRARYUPDATE || e->data == nullptr) return 0;
     auto *view = static_cast<LibraryView *>(user);
     const gval *data = e->data;
-    if (const char *rev = serialize_get_string(serialize_hash_get(data, "revision"))) view->revision = rev;
+    if (const char *rev = serialize_get_string(serialize_hash_get(data, "revision")))
+        view->revision = rev;
     if (serialize_get_int(serialize_hash_get(data, "reset")) != 0) view->reset = true;
     view->last_progress = serialize_get_int(serialize_hash_get(data, "progress"));
     const gval *items = serialize_hash_get(data, "items");
@@ -199,7 +201,8 @@ TEST_F(SimMediaTest, Iap1PlaysAPreparedIdentifierList) {
     EXPECT_EQ(zal_ipod_play_uid_list_sync(h, list + 24), 1);
     ASSERT_EQ(zal_ipod_get_db_track_info_sync(h, 13, 1, 0), 1);
     const char *name = nullptr;
-    ASSERT_EQ(zal_ipod_get_result_db_track_info_name(zal_ipod_get_result_db_track_info(h), 0, &name), 1);
+    ASSERT_EQ(
+        zal_ipod_get_result_db_track_info_name(zal_ipod_get_result_db_track_info(h), 0, &name), 1);
     EXPECT_EQ(playing_title(1), name);
     EXPECT_EQ(zal_ipod_get_db_itunes_info_sync(h, 2), 1);
     EXPECT_GE(zal_ipod_get_result_db_itunes_info_count(h), 300);
@@ -267,21 +270,34 @@ void PrintTo(const RawCase &c, std::ostream *os) {
 const RawCase kRaw[] = {
     {"browsing_needs_iap1", 0, 55, [] { return int_value(1); }, kOpError,
      "database browsing needs an iAP1 device"},
-    {"play_items_need_iap2", 1, 18, [] { return ints({0, 0}); }, kOpError,
-     "this command needs an iAP2 device"},
+    {"play_items_need_iap2", 1, 18,
+     [] {
+         return ints({0, 0});
+     },
+     kOpError, "this command needs an iAP2 device"},
     {"unknown_category", 1, 55, [] { return int_value(12); }, kOpError, "no such category"},
-    {"record_out_of_range", 1, 57, [] { return ints({9999, 5}); }, kOpError,
-     "no record 9999 in TOP"},
+    {"record_out_of_range", 1, 57,
+     [] {
+         return ints({9999, 5});
+     },
+     kOpError, "no record 9999 in TOP"},
     {"bad_hierarchy", 1, 56, [] { return int_value(3); }, kOpError,
      "the hierarchy is 1 (audio) or 2 (video)"},
-    {"negative_records", 1, 58, [] { return ints({-1, 2}); }, kOpError,
-     "GET_DB_RECORDS needs an offset and a count, both 0 or more"},
+    {"negative_records", 1, 58,
+     [] {
+         return ints({-1, 2});
+     },
+     kOpError, "GET_DB_RECORDS needs an offset and a count, both 0 or more"},
     {"indexed_beyond_queue", 1, kOpIndexedTrackInfo, [] { return int_value(3); }, kOpError,
      "no track 3 in the play queue"},
     {"indexed_first", 1, kOpIndexedTrackInfo, [] { return int_value(0); }, kOpReturn, nullptr},
-    {"play_empty_items", 0, 18, [] { return ints({0, 0}); }, kOpError, "nothing to play"},
-    {"collection_record_too_short", 0, 19, [] { return Value(serialize_struct("abc", 3)); }, kOpError,
-     "PLAYCOLLECTION needs a collection record of 144 bytes"},
+    {"play_empty_items", 0, 18,
+     [] {
+         return ints({0, 0});
+     },
+     kOpError, "nothing to play"},
+    {"collection_record_too_short", 0, 19, [] { return Value(serialize_struct("abc", 3)); },
+     kOpError, "PLAYCOLLECTION needs a collection record of 144 bytes"},
     {"uid_list_not_prepared", 1, 83, [] { return Value(serialize_bytes("\1\2\3\4\5\6\7\10", 8)); },
      kOpError, "the identifier is not in the prepared list"},
     {"prepared_size_mismatch", 1, 82,
@@ -291,7 +307,11 @@ const RawCase kRaw[] = {
          return a;
      },
      kOpError, "the identifier bytes are not size bytes of 8-byte identifiers"},
-    {"playlist_info_unknown", 1, 102, [] { return ints({500, 0}); }, kOpReturn, nullptr},
+    {"playlist_info_unknown", 1, 102,
+     [] {
+         return ints({500, 0});
+     },
+     kOpReturn, nullptr},
 };
 
 class SimMediaRawTest : public SimTest, public ::testing::WithParamInterface<RawCase> {};

@@ -429,15 +429,13 @@ ZAL_API int zal_ipod_get_result_db_track_info_capability(const gval *result, int
 /* Name of track i (full records only). */
 ZAL_API int zal_ipod_get_result_db_track_info_name(const gval *result, int i, const char **out);
 /* Artist of track i (full records only). */
-ZAL_API int zal_ipod_get_result_db_track_info_artist(const gval *result, int i,
-                                                     const char **out);
+ZAL_API int zal_ipod_get_result_db_track_info_artist(const gval *result, int i, const char **out);
 /* Album of track i (full records only). */
 ZAL_API int zal_ipod_get_result_db_track_info_album(const gval *result, int i, const char **out);
 /* Genre of track i (full records only). */
 ZAL_API int zal_ipod_get_result_db_track_info_genre(const gval *result, int i, const char **out);
 /* Composer of track i (full records only). */
-ZAL_API int zal_ipod_get_result_db_track_info_composer(const gval *result, int i,
-                                                       const char **out);
+ZAL_API int zal_ipod_get_result_db_track_info_composer(const gval *result, int i, const char **out);
 /* Duration of track i (full records only; the device's unit). */
 ZAL_API int zal_ipod_get_result_db_track_info_duration(const gval *result, int i, int *out);
 /* Persistent identifier of track i, 8 bytes most significant first, in either layout.
@@ -465,8 +463,8 @@ ZAL_API int zal_ipod_get_media_library_unique_id(zal_ipod_handle *h);
 ZAL_API int zal_ipod_get_media_library_unique_id_sync(zal_ipod_handle *h, char *buffer, int size);
 /* SET_UPDATE_ITEMS: library mlid, listLength bytes of list (below MAXIMUM_MLID_LENGTH) and an
  * optional auxiliary string (NULL: none; at most 128 characters). */
-ZAL_API int zal_ipod_set_update_items(zal_ipod_handle *h, const char *aux_string,
-                                      const char *mlid, const void *list, int listLength);
+ZAL_API int zal_ipod_set_update_items(zal_ipod_handle *h, const char *aux_string, const char *mlid,
+                                      const void *list, int listLength);
 /* As zal_ipod_set_update_items; returns 0 once the reply came or the wait ended. */
 ZAL_API int zal_ipod_set_update_items_sync(zal_ipod_handle *h, const char *aux_string,
                                            const char *mlid, const void *list, int listLength);

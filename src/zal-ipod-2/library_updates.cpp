@@ -70,7 +70,8 @@ gval *update_items_record(const char *aux_string, const char *mlid, const void *
     }
     unsigned char record[kUpdateItemsSize] = {};
     memcpy(record + kUpdateMlidOffset, mlid, strlen(mlid) + 1);
-    if (aux_string != nullptr) memcpy(record + kUpdateAuxOffset, aux_string, strlen(aux_string) + 1);
+    if (aux_string != nullptr)
+        memcpy(record + kUpdateAuxOffset, aux_string, strlen(aux_string) + 1);
     if (list_length > 0) memcpy(record + kUpdateListOffset, list, static_cast<size_t>(list_length));
     put_le32(record + kUpdateLengthOffset, static_cast<uint32_t>(list_length));
     return zal_arg_struct(record, sizeof record);

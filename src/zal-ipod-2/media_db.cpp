@@ -119,8 +119,9 @@ bool identifier_layout(const gval *result) {
 }
 
 uint32_t element_count(const gval *result) {
-    return zal_kind(result) == SERIALIZE_ARRAY ? static_cast<uint32_t>(serialize_array_count(result))
-                                               : 0;
+    return zal_kind(result) == SERIALIZE_ARRAY
+               ? static_cast<uint32_t>(serialize_array_count(result))
+               : 0;
 }
 
 // Element of field f of track i in a full-layout result, or nullptr when track i is not
@@ -276,8 +277,8 @@ ZAL_API const char *zal_ipod_record(zal_ipod_handle *h, int index) {
         return "";
     }
     if (index >= offset + count) {
-        printf("Err: offset[%d] >= (_offset[%d]+_count[%d]): \n", index,
-               static_cast<int>(offset), static_cast<int>(count));
+        printf("Err: offset[%d] >= (_offset[%d]+_count[%d]): \n", index, static_cast<int>(offset),
+               static_cast<int>(count));
         return "";
     }
     const int64_t element = index - offset + 4;
@@ -314,8 +315,7 @@ ZAL_API int zal_ipod_get_result_db_track_info_capability(const gval *result, int
 ZAL_API int zal_ipod_get_result_db_track_info_name(const gval *result, int i, const char **out) {
     return text_field(result, i, kName, out);
 }
-ZAL_API int zal_ipod_get_result_db_track_info_artist(const gval *result, int i,
-                                                     const char **out) {
+ZAL_API int zal_ipod_get_result_db_track_info_artist(const gval *result, int i, const char **out) {
     return text_field(result, i, kArtist, out);
 }
 ZAL_API int zal_ipod_get_result_db_track_info_album(const gval *result, int i, const char **out) {

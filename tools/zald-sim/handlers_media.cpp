@@ -106,7 +106,8 @@ ValuePtr track_records(const std::vector<const LibraryTrack *> &tracks, int32_t 
     const auto total = static_cast<int32_t>(tracks.size());
     const int32_t first = offset < total ? offset : total;
     const int32_t n = count < total - first ? count : total - first;
-    ValuePtr list(serialize_array_reserve(1 + static_cast<uint32_t>(n) * (identifiers_only ? 1 : 8)));
+    ValuePtr list(
+        serialize_array_reserve(1 + static_cast<uint32_t>(n) * (identifiers_only ? 1 : 8)));
     serialize_array_add(list.get(), serialize_int(n));
     for (int32_t i = first; i < first + n; ++i) {
         const LibraryTrack &t = *tracks[static_cast<size_t>(i)];
@@ -550,7 +551,8 @@ void push_library_updates(World &world, Device &d) {
             playlists = playlists || change.playlists_changed;
         }
     }
-    const size_t parts = inserted.empty() ? 1 : (inserted.size() + kItemsPerUpdate - 1) / kItemsPerUpdate;
+    const size_t parts =
+        inserted.empty() ? 1 : (inserted.size() + kItemsPerUpdate - 1) / kItemsPerUpdate;
     for (size_t part = 0; part < parts; ++part) {
         HashBuilder data;
         data.add("mlid", lib.mlid)

@@ -11,7 +11,7 @@ namespace sim {
 namespace {
 
 constexpr const char *kCategoryNames[kCategoryCount] = {
-    "TOP",   "PLAYLIST", "ARTIST",    "ALBUM",           "GENRE",        "TRACK",
+    "TOP",      "PLAYLIST",  "ARTIST",  "ALBUM",           "GENRE",        "TRACK",
     "COMPOSER", "AUDIOBOOK", "PODCAST", "NESTED_PLAYLIST", "GENIUS_MIXES", "ITUNES_U"};
 
 // Stable identifiers of artists, albums, genres and composers (FNV-1a of category and
@@ -63,16 +63,16 @@ class Lcg {
     uint32_t state_;
 };
 
-constexpr const char *kAdjectives[] = {"Silent", "Electric", "Golden", "Midnight", "Crimson",
-                                       "Hollow", "Northern", "Velvet", "Broken", "Distant",
-                                       "Neon", "Paper", "Static", "Wild", "Quiet", "Lunar"};
-constexpr const char *kNouns[] = {"Harbor", "Signal", "Engine", "River", "Garden", "Circuit",
-                                  "Highway", "Mirror", "Canyon", "Lantern", "Orbit", "Echo",
+constexpr const char *kAdjectives[] = {
+    "Silent", "Electric", "Golden", "Midnight", "Crimson", "Hollow", "Northern", "Velvet",
+    "Broken", "Distant",  "Neon",   "Paper",    "Static",  "Wild",   "Quiet",    "Lunar"};
+constexpr const char *kNouns[] = {"Harbor",  "Signal", "Engine",  "River",   "Garden", "Circuit",
+                                  "Highway", "Mirror", "Canyon",  "Lantern", "Orbit",  "Echo",
                                   "Station", "Meadow", "Voltage", "Compass"};
-constexpr const char *kGenres[] = {"Rock", "Jazz", "Electronic", "Classical", "Pop",
-                                   "Folk", "Hip-Hop", "Ambient"};
-constexpr const char *kComposers[] = {"A. Marlow", "B. Okafor", "C. Lindqvist", "D. Ferreira",
-                                      "E. Novak", "F. Haddad", "G. Tanaka", "H. Moreau",
+constexpr const char *kGenres[] = {"Rock", "Jazz", "Electronic", "Classical",
+                                   "Pop",  "Folk", "Hip-Hop",    "Ambient"};
+constexpr const char *kComposers[] = {"A. Marlow", "B. Okafor",  "C. Lindqvist", "D. Ferreira",
+                                      "E. Novak",  "F. Haddad",  "G. Tanaka",    "H. Moreau",
                                       "I. Petrov", "J. Castillo"};
 
 template <std::size_t N>
@@ -172,14 +172,15 @@ MediaLibrary MediaLibrary::generate(uint32_t seed, int32_t count) {
         lib.add_track(std::move(t));
     }
     // Play lists of random picks, and a Genius mix per genre that has enough tracks.
-    constexpr const char *kPlaylists[] = {"Road Trip", "Focus", "Evening", "Workout",
-                                          "Favourites", "Recently Added"};
+    constexpr const char *kPlaylists[] = {"Road Trip", "Focus",      "Evening",
+                                          "Workout",   "Favourites", "Recently Added"};
     for (const char *name : kPlaylists) {
         Playlist p;
         p.name = name;
         const uint32_t n = lib.tracks_.empty() ? 0 : 10 + rng.below(20);
         for (uint32_t k = 0; k < n; ++k)
-            p.tracks.push_back(lib.tracks_[rng.below(static_cast<uint32_t>(lib.tracks_.size()))].uid);
+            p.tracks.push_back(
+                lib.tracks_[rng.below(static_cast<uint32_t>(lib.tracks_.size()))].uid);
         lib.add_playlist(std::move(p));
     }
     for (const char *g : kGenres) {

@@ -145,10 +145,10 @@ struct TimedLibraryChange {
 struct MediaSession {
     int32_t hierarchy = 1;
     int32_t category = kCategoryTop;
-    Filter filter;                  // records selected so far (iAP1 browsing)
+    Filter filter;                   // records selected so far (iAP1 browsing)
     std::vector<uint64_t> prepared;  // identifier list of PREPARE_UID_LIST
-    bool updates = false;           // library update stream running
-    uint32_t sent_revision = 0;     // revision the stream has carried (0: none yet)
+    bool updates = false;            // library update stream running
+    uint32_t sent_revision = 0;      // revision the stream has carried (0: none yet)
 };
 
 }  // namespace sim

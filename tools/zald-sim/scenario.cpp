@@ -217,11 +217,12 @@ void read_library(const Source &src, const json *j, const std::string &place, De
         r ? static_cast<uint32_t>(r->integer("seed", serial_seed(d.serial), 0, UINT32_MAX))
           : serial_seed(d.serial);
     const int32_t generated =
-        r ? static_cast<int32_t>(r->integer("generate", j->contains("tracks") ? 0 : kDefaultLibraryTracks, 0, 20000))
+        r ? static_cast<int32_t>(
+                r->integer("generate", j->contains("tracks") ? 0 : kDefaultLibraryTracks, 0, 20000))
           : kDefaultLibraryTracks;
     d.library = MediaLibrary::generate(seed, generated);
-    d.library.mlid = r ? r->text("mlid", "SIMLIB-" + d.serial, MAXIMUM_MLID_LENGTH - 1)
-                       : "SIMLIB-" + d.serial;
+    d.library.mlid =
+        r ? r->text("mlid", "SIMLIB-" + d.serial, MAXIMUM_MLID_LENGTH - 1) : "SIMLIB-" + d.serial;
     if (r) d.library.genius_available = r->flag("genius", true);
     for (Track &t : d.tracks) {
         LibraryTrack lt;
@@ -235,7 +236,8 @@ void read_library(const Source &src, const json *j, const std::string &place, De
         t.uid = d.library.add_track(std::move(lt));
     }
     if (!r) return;
-    for (LibraryTrack &t : read_library_tracks(src, *r, "tracks")) d.library.add_track(std::move(t));
+    for (LibraryTrack &t : read_library_tracks(src, *r, "tracks"))
+        d.library.add_track(std::move(t));
     if (const json *lists = r->array("playlists")) {
         for (size_t i = 0; i < lists->size(); ++i) {
             const std::string list_place = item_place(r->place("playlists"), i);
