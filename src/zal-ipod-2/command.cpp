@@ -145,3 +145,11 @@ const char *zal_hash_string(const gval *hash, const char *key) {
     gval *v = zal_kind(hash) == SERIALIZE_HASH ? serialize_hash_get(hash, key) : nullptr;
     return zal_kind(v) == SERIALIZE_STRING ? serialize_get_string(v) : nullptr;
 }
+
+gval *zal_reply_value(const zal_ipod_reply *reply) {
+    return reply_value(reply);
+}
+
+bool zal_reply_error(zal_ipod_handle *h, const gval *hash) {
+    return zal_kind(hash) == SERIALIZE_HASH && take_error(h, hash);
+}

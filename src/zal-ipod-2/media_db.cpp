@@ -17,20 +17,6 @@ zal_records_state::~zal_records_state() {
 
 namespace {
 
-gval *reply_value(const zal_ipod_reply *reply) {
-    if (reply == nullptr || reply->length == 0 || reply->payload == nullptr) return nullptr;
-    return unserialize(reply->payload, reply->length);
-}
-
-// Stores the "error" text of a hash; true when there was one.
-bool take_error(zal_ipod_handle *h, const gval *hash) {
-    const gval *error = serialize_hash_get(hash, "error");
-    if (error == nullptr) return false;
-    zal_set_error_message(h,
-                          zal_kind(error) == SERIALIZE_STRING ? serialize_get_string(error) : "");
-    return true;
-}
-
 int32_t array_int(const gval *array, uint32_t i, int32_t fallback) {
     const gval *v = serialize_array_get(array, i);
     return zal_kind(v) == SERIALIZE_INT ? serialize_get_int(v) : fallback;
@@ -42,10 +28,10 @@ int32_t array_int(const gval *array, uint32_t i, int32_t fallback) {
 // -1, and the previous result stays.
 int32_t decode_track_info(zal_ipod_handle *h, const zal_ipod_reply *reply, gval **result) {
     if (h == nullptr) return -1;
-    gval *v = reply_value(reply);
+    gval *v = zal_reply_value(reply);
     if (v == nullptr) return -1;
     if (zal_kind(v) != SERIALIZE_ARRAY) {
-        if (zal_kind(v) == SERIALIZE_HASH) take_error(h, v);
+        if (zal_kind(v) == SERIALIZE_HASH) zal_reply_error(h, v);
         serialize_free(v);
         return -1;
     }
@@ -152,7 +138,7 @@ int text_field(const gval *result, int i, uint32_t f, const char **out) {
 int32_t zal_records_decode(zal_ipod_handle *h, const zal_ipod_reply *reply) {
     if (h == nullptr || reply == nullptr || reply->length == 0 || reply->payload == nullptr)
         return -1;
-    gval *v = reply_value(reply);
+    gval *v = zal_reply_value(reply);
     if (zal_kind(v) != SERIALIZE_ARRAY) {
         serialize_free(v);
         return 1;
