@@ -322,8 +322,11 @@ ZAL_API uint16_t zal_ipod_set_config(zal_ipod_handle *h, const char *key, const 
 ZAL_API int zal_ipod_set_config_sync(zal_ipod_handle *h, const char *key, const char *value);
 /* GET_CONFIG for key; returns the request's transaction id. */
 ZAL_API uint16_t zal_ipod_get_config(zal_ipod_handle *h, const char *key);
-/* 1 with the value copied whole into out (room for the longest value the daemon returns),
- * else the daemon's error code, else -2 (no reply or neither in it; out untouched). */
+/* Room that zal_ipod_get_config_sync needs in out, terminator included. */
+#define ZAL_IPOD_CONFIG_VALUE_SIZE 1024
+/* 1 with the value copied whole into out, which must hold ZAL_IPOD_CONFIG_VALUE_SIZE
+ * bytes; else the daemon's error code; else -2 (no reply, neither in it, or a value too
+ * long for that room, which is logged and never cut: out is then untouched). */
 ZAL_API int zal_ipod_get_config_sync(zal_ipod_handle *h, const char *key, char *out);
 
 /* ---- Now playing -------------------------------------------------------------------------
@@ -532,6 +535,35 @@ ZAL_API int zal_ipod_get_playlist_info_sync(zal_ipod_handle *h, int a, int b, ui
 /* ---- Connection state --------------------------------------------------------------------
  * Learning that the connection was lost and came back.
  * ---------------------------------------------------------------------------------- */
+
+/* Connection state as the connection callback reports it. */
+typedef enum zal_ipod_connection_state {
+    ZALIPOD_CONNECTION_LOST = 0,     /* the daemon went away; the library will reconnect */
+    ZALIPOD_CONNECTION_RESTORED = 1  /* connected again, device list fetched anew */
+} zal_ipod_connection_state;
+
+/* Connection callback; state is a zal_ipod_connection_state. */
+typedef void (*zal_ipod_connection_cb)(zal_ipod_handle *h, int state, void *user);
+
+/* Asks to be told when the connection to the daemon is lost and when it is made again,
+ * so that an application can open its session and resubscribe after the daemon
+ * restarted (the daemon forgets sessions with their connection; the handle's session
+ * state is kept as it was, so open the session again on RESTORED).
+ *
+ * Setting a callback also changes how an orderly close by the daemon is treated: without
+ * one, the socket is kept until a send to it fails; with one, the close counts as lost at
+ * once and the reader starts reconnecting (to the connect address or ZALIPODDAEMON, as any
+ * reconnect). Each loss is reported once (LOST), each successful reconnect once
+ * (RESTORED); several changes noticed between two dispatches are reported in order,
+ * ending with the current state.
+ *
+ * The callback runs where events are delivered (zal_ipod_read, zal_ipod_events_iterate,
+ * the loop thread), with no library lock held: it may send commands, the _sync forms
+ * included. A change noticed while it runs is reported after it returns. NULL removes the
+ * callback and restores the default treatment of an orderly close. Any thread may set
+ * it. */
+ZAL_API void zal_ipod_set_connection_cb(zal_ipod_handle *h, zal_ipod_connection_cb cb,
+                                        void *user);
 
 ZAL_END_DECLS
 

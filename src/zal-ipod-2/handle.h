@@ -41,6 +41,10 @@ struct zal_pending_slots {
     uint32_t preference_class = 0;
 };
 
+// Bits of zal_ipod_handle::connection_changes.
+constexpr unsigned kConnectionLost = 1u;
+constexpr unsigned kConnectionRestored = 2u;
+
 // Every 16-bit transaction id has an entry, so lookups need no range check.
 constexpr std::size_t kTransactionTableSize = 65536;
 // request_opcodes entry of a request whose wait gave up.
@@ -74,6 +78,18 @@ struct zal_ipod_handle {
     // forever: the reader waits out its half second instead of spinning, until a failed
     // send marks the socket broken and the next read reconnects.
     std::atomic<bool> peer_closed{false};
+
+    // Connection state reports (opt-in): the application's callback, and the changes the
+    // reader noticed that the dispatcher has not reported yet (kConnectionLost /
+    // kConnectionRestored bits). Reported by the dispatcher, never from inside the reader.
+    std::atomic<zal_ipod_connection_cb> connection_cb{nullptr};
+    std::atomic<void *> connection_cb_data{nullptr};
+    std::atomic<unsigned> connection_changes{0};
+    // True while the connection callback runs: a change noticed meanwhile waits until it
+    // returns instead of calling it again from within.
+    std::atomic<bool> reporting_connection{false};
+    // The state the application was last told (connected at first).
+    std::atomic<bool> reported_up{true};
 
     // Session and devices.
     std::atomic<uint32_t> ready{0};

@@ -63,10 +63,15 @@ int split_packets(zal_ipod_handle *h) {
     uint32_t pos = 0;
     zal_ipod_reply *first = nullptr;
     zal_ipod_reply *last = nullptr;
+    bool broken = false;
     while (h->rx_length - pos >= kPacketHeaderSize) {
         const unsigned char *p = h->rx_buffer + pos;
         uint32_t length = read_be32(p + 8);
-        if (length > kMaxPayloadLength) return -1;
+        if (length > kMaxPayloadLength) {
+            // The whole packets before it are still queued; the caller drops the stream.
+            broken = true;
+            break;
+        }
         if (length > h->rx_length - pos - kPacketHeaderSize) {
             // Reserve the whole packet now: the reads that complete it append in place.
             rx_reserve(h, length - (h->rx_length - pos - static_cast<uint32_t>(kPacketHeaderSize)));
@@ -90,6 +95,7 @@ int split_packets(zal_ipod_handle *h) {
         ++queued;
     }
     queue_append(h, first, last, queued);
+    if (broken) return -1;
     if (pos > 0) {
         h->rx_length -= pos;
         if (h->rx_length > 0) memmove(h->rx_buffer, h->rx_buffer + pos, h->rx_length);
@@ -160,7 +166,10 @@ int safesend(int fd, const void *bytes, std::size_t size) {
 void zal_connection_drop_locked(zal_ipod_handle *h) {
     pthread_mutex_lock(&h->send_lock);
     int fd = h->fd.exchange(-1);
-    if (fd >= 0) close(fd);
+    if (fd >= 0) {
+        close(fd);
+        h->connection_changes.fetch_or(kConnectionLost);
+    }
     h->send_failed = false;
     h->peer_closed = false;
     h->rx_length = 0;
@@ -264,10 +273,13 @@ int zal_ipod_receive(zal_ipod_handle *h) {
         error = errno;
     } else {
         error = ENOMEM;
+        ZAL_LOGE("%s: out of memory for the receive buffer\n", __func__);
     }
     if (n <= 0) {
-        bool broken =
-            h->send_failed.load() || error == ECONNRESET || error == ENOTCONN || error == EBADF;
+        // An orderly close keeps the socket until a send fails, unless the application
+        // asked to hear about lost connections: then the close is a loss at once.
+        bool broken = h->send_failed.load() || error == ECONNRESET || error == ENOTCONN ||
+                      error == EBADF || (n == 0 && h->connection_cb.load() != nullptr);
         if (n == 0 && !broken) h->peer_closed = true;
         if (broken) zal_connection_drop_locked(h);
         pthread_mutex_unlock(&h->read_lock);

@@ -1,0 +1,151 @@
+// The command table and the readers of the client fuzz harness.
+#include "client_fuzz_commands.h"
+
+#include <cstddef>
+#include <cstring>
+
+namespace {
+
+using Command = void (*)(zal_ipod_handle *h);
+
+// Keeps results alive so that the calls are not optimised away.
+volatile long sink;
+
+void use(long v) {
+    sink = sink + v;
+}
+void use(const void *p) {
+    sink = sink + (p != nullptr ? 1 : 0);
+}
+void use_text(const char *s) {
+    if (s != nullptr) sink = sink + static_cast<long>(strlen(s));
+}
+
+char config_value[ZAL_IPOD_CONFIG_VALUE_SIZE];
+
+const Command kCommands[] = {
+    [](zal_ipod_handle *h) { use(zal_ipod_open_session_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_close_session_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_config_sync(h, "socket_name", config_value)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_config_sync(h, "device", "usb")); },
+    [](zal_ipod_handle *h) {
+        zal_ipod_reply *r = zal_ipod_wait_for_tid(h, zal_ipod_hello(h));
+        zal_ipod_reply_free(r);
+    },
+    [](zal_ipod_handle *h) { use(zal_ipod_keep_alive_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_play_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_playpause_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_stop_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_pause_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_next_track_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_prev_track_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_mute_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_inc_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_dec_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_start_device_audio_info_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_stop_device_audio_info_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_start_tracking_dec_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_start_tracking_inc_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_start_tracking_normal_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_start_ffw_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_start_rew_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_stop_ffwrew_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_voice_command_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_promote_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_demote_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_add_to_cart_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_start_bt_connection_updates_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_stop_bt_connection_updates_sync(h)); },
+};
+
+}  // namespace
+
+unsigned zal_fuzz_command_count() {
+    return sizeof kCommands / sizeof kCommands[0];
+}
+
+void zal_fuzz_run_command(zal_ipod_handle *h, unsigned selector) {
+    kCommands[selector % (sizeof kCommands / sizeof kCommands[0])](h);
+}
+
+void zal_fuzz_read_event(const zal_ipod_event *e) {
+    uint32_t length = 0;
+    const void *bytes = zal_ipod_event_eap_datagram_data(e, &length);
+    if (bytes != nullptr && length > 0) use(static_cast<const unsigned char *>(bytes)[length - 1]);
+    const char *text = nullptr;
+    if (zal_ipod_event_wifi_information_ssid(e, &text) > 0) use_text(text);
+    if (zal_ipod_event_wifi_information_passphrase(e, &text) > 0) use_text(text);
+    use(zal_ipod_event_type(e));
+    use_text(zal_ipod_event_get_serial(e));
+    use_text(zal_ipod_event_connected_serial(e));
+    use_text(zal_ipod_event_disconnected_serial(e));
+    use(zal_ipod_event_authenticated(e));
+    use(zal_ipod_event_mode_changed(e));
+    use(zal_ipod_event_time_position(e));
+    use(zal_ipod_event_get_media_lib_update_progress(e));
+    use_text(zal_ipod_event_bluetooth_status(e));
+    use_text(zal_ipod_event_get_playing_app(e));
+    use(zal_ipod_event_shuffle_status(e));
+    use(zal_ipod_event_role_switched(e));
+    use(zal_ipod_event_eap_datagram_session_id(e));
+    use(zal_ipod_event_eap_datagram_protocol_index(e));
+    use(zal_ipod_event_location_information_state(e));
+    use(zal_ipod_event_location_supported_NMEA(e));
+    use_text(zal_ipod_event_telephony_callstate_remote_id(e));
+    use_text(zal_ipod_event_telephony_callstate_display_name(e));
+    use(zal_ipod_event_telephony_callstate_status(e));
+    use(zal_ipod_event_telephony_callstate_direction(e));
+    use_text(zal_ipod_event_telephony_callstate_call_uuid(e));
+    use_text(zal_ipod_event_telephony_callstate_address_book_id(e));
+    use_text(zal_ipod_event_telephony_callstate_label(e));
+    use(zal_ipod_event_telephony_callstate_service(e));
+    use(zal_ipod_event_telephony_callstate_is_conferenced(e));
+    use(zal_ipod_event_telephony_callstate_conference_group(e));
+    use(zal_ipod_event_telephony_callstate_disconnect_reason(e));
+    use(zal_ipod_event_vehicle_status_update_is_started(e));
+    use(zal_ipod_event_vehicle_status_update_night_mode(e));
+    use(zal_ipod_event_vehicle_status_update_range(e));
+    use(zal_ipod_event_vehicle_status_update_outside_temperature(e));
+    use(zal_ipod_event_vehicle_status_update_inside_temperature(e));
+    use(zal_ipod_event_vehicle_status_update_range_warning(e));
+    use(zal_ipod_event_wifi_information_status(e));
+    use(zal_ipod_event_wifi_information_type(e));
+    use(zal_ipod_event_telephony_update_strength(e));
+    use(zal_ipod_event_telephony_update_registration_status(e));
+    use(zal_ipod_event_telephony_update_airplane_mode(e));
+    use_text(zal_ipod_event_telephony_update_carrier_name(e));
+    use(zal_ipod_event_telephony_update_cellular_supported(e));
+    use(zal_ipod_event_telephony_update_telephony_enabled(e));
+    use(zal_ipod_event_telephony_update_facetime_audio_enabled(e));
+    use(zal_ipod_event_telephony_update_facetime_video_enabled(e));
+    use(zal_ipod_event_telephony_update_mute_status(e));
+    use(zal_ipod_event_telephony_update_current_call_count(e));
+    use(zal_ipod_event_telephony_update_new_voicemail_count(e));
+    use(zal_ipod_event_telephony_update_initiate_call_available(e));
+    use(zal_ipod_event_telephony_update_end_and_accept_available(e));
+    use(zal_ipod_event_telephony_update_hold_and_accept_available(e));
+    use(zal_ipod_event_telephony_update_swap_available(e));
+    use(zal_ipod_event_telephony_update_merge_available(e));
+    use(zal_ipod_event_telephony_update_hold_available(e));
+    use(zal_ipod_event_wireless_carplay_update_status(e));
+}
+
+void zal_fuzz_read_handle(zal_ipod_handle *h) {
+    const int count = zal_ipod_device_count(h);
+    for (int i = -1; i <= count; ++i) {
+        use_text(zal_ipod_device_serial(h, i));
+        use(zal_ipod_device_transport_mode(h, i));
+        use(zal_ipod_device_usb_bus(h, i));
+        use(zal_ipod_device_usb_address(h, i));
+        use(zal_ipod_device_rfcomm_id(h, i));
+        use(zal_ipod_device_used(h, i));
+        use(zal_ipod_device_authenticated(h, i));
+        use(zal_ipod_device_is_extended(h, i));
+        use(zal_ipod_device_protocol(h, i));
+    }
+    use_text(zal_ipod_device_name(h));
+    use_text(zal_ipod_get_error_message(h));
+    use(zal_ipod_current_session(h));
+    use(zal_ipod_is_session_opened(h));
+    use(zal_ipod_is_ready(h));
+}
