@@ -943,9 +943,184 @@ ZAL_API int zal_ipod_send_accessory_wifi_configuration_information(zal_ipod_hand
  * Categories, records and track records of older devices.
  * ---------------------------------------------------------------------------------- */
 
+/* Hierarchy numbers, category numbers, capability bits and durations are the device's; the
+ * library passes them through. Each command has its transaction-id form and a _sync form
+ * (same arguments) that waits and decodes. */
+
+/* SET_HIERARCHY; on sending, the hierarchy becomes the one a browser reset restores.
+ * _sync: the daemon's integer, -1 on failure. */
+ZAL_API int zal_ipod_set_hierarchy(zal_ipod_handle *h, int hierarchy);
+/* See zal_ipod_set_hierarchy. */
+ZAL_API int zal_ipod_set_hierarchy_sync(zal_ipod_handle *h, int hierarchy);
+/* SET_CATEGORY; on sending, the current category becomes category. */
+ZAL_API int zal_ipod_set_category(zal_ipod_handle *h, int category);
+/* Sets the current category (even when nothing can be sent), sends SET_CATEGORY and returns
+ * the daemon's integer, the number of records in the category, also kept as the record
+ * count; -1 (and a record count of -1) on failure. */
+ZAL_API int zal_ipod_set_category_sync(zal_ipod_handle *h, int category);
+/* SELECT_DB [record, category]: narrows the next category to one record. */
+ZAL_API int zal_ipod_select_db(zal_ipod_handle *h, int record, int category);
+/* As zal_ipod_select_db; the daemon's integer is kept as the record count (-1 on failure). */
+ZAL_API int zal_ipod_select_db_sync(zal_ipod_handle *h, int record, int category);
+/* GET_DB_RECORDS [offset, count]: names of records offset..offset+count-1. */
+ZAL_API int zal_ipod_get_records(zal_ipod_handle *h, int offset, int count);
+/* As zal_ipod_get_records; an array reply replaces the records cache (read with
+ * zal_ipod_record) and its validity flag is returned; any other reply changes nothing and
+ * gives 1; no reply gives -1. */
+ZAL_API int zal_ipod_get_records_sync(zal_ipod_handle *h, int offset, int count);
+/* INDEXED_TRACK_INFO for track index of the play queue. */
+ZAL_API int zal_ipod_indexed_track_info(zal_ipod_handle *h, int index);
+/* As zal_ipod_indexed_track_info: the integer "indexed_track_info" of the reply, -1 on failure. */
+ZAL_API int zal_ipod_indexed_track_info_sync(zal_ipod_handle *h, int index);
+/* GET_DB_ITUNES_INFO for an information type (0 library identifier, 1 last sync time,
+ * others a count). */
+ZAL_API int zal_ipod_get_db_itunes_info(zal_ipod_handle *h, int type);
+/* As zal_ipod_get_db_itunes_info: 1 once the answer is stored (read it with the
+ * zal_ipod_get_result_db_ accessors), -1 for no reply, an error, or an answer that lacks
+ * the requested field (the stored field is then left as it was). The reply is also dumped
+ * on standard output. */
+ZAL_API int zal_ipod_get_db_itunes_info_sync(zal_ipod_handle *h, int type);
+/* GET_DB_TRACK_INFO [offset, count, identifiers_only]: track records of the database. */
+ZAL_API int zal_ipod_get_db_track_info(zal_ipod_handle *h, int offset, int count,
+                                       int identifiers_only);
+/* As zal_ipod_get_db_track_info: 1 once the result replaced the DB track info result,
+ * -1 for no reply, an error reply or a reply that is not a record list. */
+ZAL_API int zal_ipod_get_db_track_info_sync(zal_ipod_handle *h, int offset, int count,
+                                            int identifiers_only);
+/* GET_PB_TRACK_INFO [offset, count, identifiers_only]: track records of the play queue. */
+ZAL_API int zal_ipod_get_pb_track_info(zal_ipod_handle *h, int offset, int count,
+                                       int identifiers_only);
+/* As zal_ipod_get_db_track_info, into the PB track info result. */
+ZAL_API int zal_ipod_get_pb_track_info_sync(zal_ipod_handle *h, int offset, int count,
+                                            int identifiers_only);
+
+/* Current category (0 in a new handle and after a session opens). */
+ZAL_API int zal_ipod_get_category(zal_ipod_handle *h);
+/* Records in the current category as last reported; -1 after a failed request. */
+ZAL_API int zal_ipod_record_count(zal_ipod_handle *h);
+/* Name of record index from the records cache, or "" when the cache does not hold it (an
+ * index outside the cached range also writes a line on standard output). The text lives
+ * until the cache is replaced. */
+ZAL_API const char *zal_ipod_record(zal_ipod_handle *h, int index);
+/* Last DB / PB track info result (NULL before the first); owned by the handle and valid
+ * until the next result of the same kind. */
+ZAL_API const gval *zal_ipod_get_result_db_track_info(zal_ipod_handle *h);
+/* See zal_ipod_get_result_db_track_info. */
+ZAL_API const gval *zal_ipod_get_result_pb_track_info(zal_ipod_handle *h);
+/* The 8 bytes of the device library identifier (type 0 of the library information). */
+ZAL_API const uint8_t *zal_ipod_get_result_db_device_uid(zal_ipod_handle *h);
+/* The 7 bytes of the last sync time (type 1 of the library information). */
+ZAL_API const uint8_t *zal_ipod_get_result_db_last_sync_time(zal_ipod_handle *h);
+/* The count of the last library information of another type; -1 without a handle. */
+ZAL_API int zal_ipod_get_result_db_itunes_info_count(zal_ipod_handle *h);
+
+/* Track info results. A result lists either identifiers only (each an 8-byte byte string)
+ * or full records of eight elements (capability, name, artist, album, genre, composer,
+ * duration, identifier). Track i counts from 0. Each accessor returns 1 and sets *out when
+ * the result holds that field of track i with the right kind, else 0 with *out untouched.
+ * Texts and bytes point into the result and live as long as it. */
+/* Number of tracks in result; 0 for NULL. */
+ZAL_API int zal_ipod_get_result_db_track_info_count(const gval *result);
+/* Capability bits of track i (full records only). */
+ZAL_API int zal_ipod_get_result_db_track_info_capability(const gval *result, int i, int *out);
+/* Name of track i (full records only). */
+ZAL_API int zal_ipod_get_result_db_track_info_name(const gval *result, int i, const char **out);
+/* Artist of track i (full records only). */
+ZAL_API int zal_ipod_get_result_db_track_info_artist(const gval *result, int i, const char **out);
+/* Album of track i (full records only). */
+ZAL_API int zal_ipod_get_result_db_track_info_album(const gval *result, int i, const char **out);
+/* Genre of track i (full records only). */
+ZAL_API int zal_ipod_get_result_db_track_info_genre(const gval *result, int i, const char **out);
+/* Composer of track i (full records only). */
+ZAL_API int zal_ipod_get_result_db_track_info_composer(const gval *result, int i, const char **out);
+/* Duration of track i (full records only; the device's unit). */
+ZAL_API int zal_ipod_get_result_db_track_info_duration(const gval *result, int i, int *out);
+/* Persistent identifier of track i, 8 bytes most significant first, in either layout.
+ * When the element is a byte string of another length *out is still set (to bytes that
+ * must not be read as an identifier) and 0 is returned. */
+ZAL_API int zal_ipod_get_result_db_track_info_uid(const gval *result, int i, const uint8_t **out);
+
 /* ---- Library updates and play lists ------------------------------------------------------
  * Library update items, collections, play lists, Genius and play items.
  * ---------------------------------------------------------------------------------- */
+
+/* A media library identifier (mlid) is shorter than this: at most 127 characters. */
+#define MAXIMUM_MLID_LENGTH 128
+
+/* Persistent identifiers are unsigned 64-bit numbers. Requests whose arguments break a
+ * stated limit (an mlid of 128 characters or more, a list of 128 bytes or more, a negative
+ * count or size, a missing list) are not sent: they log an error and return 0 (the _sync
+ * form then returns -1, or 0 where it always does). */
+
+/* MEDIA_LIB_UID: the identifier of the device's media library. */
+ZAL_API int zal_ipod_get_media_library_unique_id(zal_ipod_handle *h);
+/* As zal_ipod_get_media_library_unique_id: 1 when the reply is a string, copied with its
+ * terminator into buffer but never more than size bytes (so a short buffer gets no
+ * terminator); 0 otherwise, buffer untouched. */
+ZAL_API int zal_ipod_get_media_library_unique_id_sync(zal_ipod_handle *h, char *buffer, int size);
+/* SET_UPDATE_ITEMS: library mlid, listLength bytes of list (below MAXIMUM_MLID_LENGTH) and an
+ * optional auxiliary string (NULL: none; at most 128 characters). */
+ZAL_API int zal_ipod_set_update_items(zal_ipod_handle *h, const char *aux_string, const char *mlid,
+                                      const void *list, int listLength);
+/* As zal_ipod_set_update_items; returns 0 once the reply came or the wait ended. */
+ZAL_API int zal_ipod_set_update_items_sync(zal_ipod_handle *h, const char *aux_string,
+                                           const char *mlid, const void *list, int listLength);
+/* START_LIB_UPDATE with the daemon's text; changes follow as "medialibrary_update" events. */
+ZAL_API int zal_ipod_start_library_update(zal_ipod_handle *h, const char *text);
+/* As zal_ipod_start_library_update; returns 0 once the reply came or the wait ended. */
+ZAL_API int zal_ipod_start_library_update_sync(zal_ipod_handle *h, const char *text);
+/* STOP_LIB_UPDATE with the daemon's text. */
+ZAL_API int zal_ipod_stop_library_update(zal_ipod_handle *h, const char *text);
+/* As zal_ipod_stop_library_update; returns 0 once the reply came or the wait ended. */
+ZAL_API int zal_ipod_stop_library_update_sync(zal_ipod_handle *h, const char *text);
+/* RESUME_LIB_UPDATE [first, second] (the daemon's texts, e.g. library and revision). */
+ZAL_API int zal_ipod_resume_library_update(zal_ipod_handle *h, const char *first,
+                                           const char *second);
+/* As zal_ipod_resume_library_update; returns 0 once the reply came or the wait ended. */
+ZAL_API int zal_ipod_resume_library_update_sync(zal_ipod_handle *h, const char *first,
+                                                const char *second);
+/* PLAYITEMS: plays count identifiers (uids) starting with the one at start. */
+ZAL_API int zal_play_items(zal_ipod_handle *h, const uint64_t *uids, int count, int start);
+/* As zal_play_items: the reply's "items_played", -1 for an error (its text kept), a
+ * missing or malformed reply. */
+ZAL_API int zal_play_items_sync(zal_ipod_handle *h, const uint64_t *uids, int count, int start);
+/* PLAYCOLLECTION: plays collection_id of a collection type (0 play list or Genius mix,
+ * 1 artist, 2 album, 4 genre, 5 composer; sent as one byte) of library mlid from
+ * start_index. */
+ZAL_API int zal_play_collection(zal_ipod_handle *h, uint64_t collection_id, int type,
+                                int start_index, const char *mlid);
+/* As zal_play_collection: the reply's "collection_played", -1 on failure. */
+ZAL_API int zal_play_collection_sync(zal_ipod_handle *h, uint64_t collection_id, int type,
+                                     int start_index, const char *mlid);
+/* PREPARE_UID_LIST [first, second, size, size bytes]: hands the daemon an identifier list
+ * (8 bytes each, most significant first) for zal_ipod_play_uid_list. */
+ZAL_API int zal_ipod_prepare_uid_list(zal_ipod_handle *h, int first, int second, int size,
+                                      const void *bytes);
+/* As zal_ipod_prepare_uid_list: the daemon's integer, -1 on failure. */
+ZAL_API int zal_ipod_prepare_uid_list_sync(zal_ipod_handle *h, int first, int second, int size,
+                                           const void *bytes);
+/* PLAY_UID_LIST: plays the prepared list from the track with this identifier. */
+ZAL_API int zal_ipod_play_uid_list(zal_ipod_handle *h, const uint8_t uid[8]);
+/* As zal_ipod_play_uid_list: the daemon's integer, -1 on failure. */
+ZAL_API int zal_ipod_play_uid_list_sync(zal_ipod_handle *h, const uint8_t uid[8]);
+/* CREATE_GENIUS_PLAYLIST [a, b] (the device's arguments). */
+ZAL_API int zal_ipod_create_genius_playlist(zal_ipod_handle *h, int a, int b);
+/* As zal_ipod_create_genius_playlist: the daemon's integer, -1 on failure. */
+ZAL_API int zal_ipod_create_genius_playlist_sync(zal_ipod_handle *h, int a, int b);
+/* REFRESH_GENIUS_PLAYLIST a. */
+ZAL_API int zal_ipod_refresh_genius_playlist(zal_ipod_handle *h, int a);
+/* As zal_ipod_refresh_genius_playlist: the daemon's integer, -1 on failure. */
+ZAL_API int zal_ipod_refresh_genius_playlist_sync(zal_ipod_handle *h, int a);
+/* IS_GENIUS_AVAILABLEFORTRACK [a, b]. */
+ZAL_API int zal_ipod_is_genius_availablefortrack(zal_ipod_handle *h, int a, int b);
+/* As zal_ipod_is_genius_availablefortrack: 0 when Genius is not available (or no reply),
+ * otherwise the reply's non-zero "result", or 1. */
+ZAL_API int zal_ipod_is_genius_availablefortrack_sync(zal_ipod_handle *h, int a, int b);
+/* GET_PLAYLIST_INFO [a, b]. */
+ZAL_API int zal_ipod_get_playlist_info(zal_ipod_handle *h, int a, int b);
+/* As zal_ipod_get_playlist_info: the reply's "status", -1 when there is no information;
+ * when data is not NULL the low 8 bits of the reply's "data" are stored there. */
+ZAL_API int zal_ipod_get_playlist_info_sync(zal_ipod_handle *h, int a, int b, uint8_t *data);
 
 /* ---- Media browser -----------------------------------------------------------------------
  * Categories, filtered queries, the selection stack and playing a selection.

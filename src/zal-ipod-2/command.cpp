@@ -44,6 +44,9 @@ gval *zal_arg_string(const char *s) {
 gval *zal_arg_bytes(const void *p, uint32_t n) {
     return serialize_bytes(p, n);
 }
+gval *zal_arg_struct(const void *p, uint32_t n) {
+    return serialize_struct(p, n);
+}
 
 gval *zal_arg_byte_string(const void *p, int32_t n) {
     if (n < 0 || (p == nullptr && n > 0)) return nullptr;
@@ -167,4 +170,10 @@ void zal_copy_text(char *buffer, std::size_t size, const char *text) {
     const std::size_t length = text != nullptr ? strnlen(text, size - 1) : 0;
     if (length > 0) memcpy(buffer, text, length);
     buffer[length] = '\0';
+gval *zal_reply_value(const zal_ipod_reply *reply) {
+    return reply_value(reply);
+}
+
+bool zal_reply_error(zal_ipod_handle *h, const gval *hash) {
+    return zal_kind(hash) == SERIALIZE_HASH && take_error(h, hash);
 }

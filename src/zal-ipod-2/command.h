@@ -41,6 +41,8 @@ gval *zal_arg_int(int32_t v);
 gval *zal_arg_bool(int v);
 gval *zal_arg_string(const char *s);
 gval *zal_arg_bytes(const void *p, uint32_t n);
+// Opaque record sent as one struct value (fixed-layout records).
+gval *zal_arg_struct(const void *p, uint32_t n);
 // Array of integers, in parameter order (narrow parameters widened without sign first).
 gval *zal_arg_ints(std::initializer_list<int32_t> items);
 // Array of already built items (owned); nullptr and every item freed if one is nullptr.
@@ -140,3 +142,13 @@ auto zal_cmd_sync_with(zal_ipod_handle *h, int tid, Decode &&decode) {
     reply_record_free(reply);
     return result;
 }
+// Reads an integer under key of a hash; fallback when absent or not an integer.
+int32_t zal_hash_int(const gval *hash, const char *key, int32_t fallback);
+// String under key, or nullptr.
+const char *zal_hash_string(const gval *hash, const char *key);
+
+// For decoders that read a reply record themselves: its decoded payload (nullptr without
+// one; the caller frees it), and the "error" text of a reply hash stored as the handle's
+// error text (true when there was one).
+gval *zal_reply_value(const zal_ipod_reply *reply);
+bool zal_reply_error(zal_ipod_handle *h, const gval *hash);

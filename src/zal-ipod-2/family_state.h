@@ -7,9 +7,3 @@
 #include <cstdint>
 
 #include "zal-ipod-2/artwork_state.h"
-
-// iAP1 database browsing: record counts and results of the last category requests.
-struct zal_records_state {
-    int32_t record_count = 0;
-    void reset() {}
-};

@@ -13,6 +13,7 @@
 #include "zal-ipod-2/device_control_state.h"
 #include "zal-ipod-2/device_info_state.h"
 #include "zal-ipod-2/family_state.h"
+#include "zal-ipod-2/media_db_state.h"
 #include "zal-ipod-2/playback_state.h"
 
 // Transaction ids of the last request of each kind whose reply needs a decoder of its own.

@@ -5,6 +5,7 @@
 #include "zal-ipod-2/command.h"
 #include "zal-ipod-2/device_decoders.h"
 #include "zal-ipod-2/devices.h"
+#include "zal-ipod-2/media_db_state.h"
 #include "zal-ipod-2/playback_state.h"
 
 namespace {
@@ -43,11 +44,11 @@ constexpr zal_reply_decoder_row kDecoders[] = {
     {&S::artwork_by_uid_tid, zal_artwork_decode, true},
     {&S::artwork_tid, zal_artwork_decode, true},
     {&S::sample_rate_tid, zal_decode_sample_rate, true},
-    {&S::records_tid, nullptr, false},
+    {&S::records_tid, zal_records_decode, false},
     {&S::session_tid, zal_session_decode_open, false},
-    {&S::itunes_info_tid, nullptr, false},
-    {&S::db_track_info_tid, nullptr, false},
-    {&S::pb_track_info_tid, nullptr, false},
+    {&S::itunes_info_tid, zal_itunes_info_decode, false},
+    {&S::db_track_info_tid, zal_db_track_info_decode, false},
+    {&S::pb_track_info_tid, zal_pb_track_info_decode, false},
     {&S::uid_list_tid, decode_uid_list, false},
     {&S::lingo_version_tid, zal_lingo_version_decode, false},
     {&S::localization_tid, zal_localization_decode, false},

@@ -23,6 +23,7 @@ HandlerTable make_handler_table() {
     register_artwork_handlers(table);
     register_device_handlers(table);
     register_comms_handlers(table);
+    register_media_handlers(table);
     return table;
 }
 

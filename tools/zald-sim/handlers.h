@@ -58,5 +58,6 @@ void register_playback_handlers(HandlerTable &table);
 void register_artwork_handlers(HandlerTable &table);
 void register_device_handlers(HandlerTable &table);
 void register_comms_handlers(HandlerTable &table);
+void register_media_handlers(HandlerTable &table);
 
 }  // namespace sim

@@ -13,6 +13,7 @@
 
 #include "zal-ipod-2/common.h"
 #include "zal-ipod-2/daemon.h"
+#include "zal-ipod-2/zal-ipod-2.h"
 
 namespace sim {
 
@@ -203,6 +204,111 @@ ArtworkSpec read_artwork(const Source &src, const json &j, const std::string &pl
     a.pixel_format = static_cast<int32_t>(r.integer("pixel_format", 2, 2, 3));
     r.finish();
     return a;
+LibraryTrack read_library_track(const Source &src, const json &j, const std::string &place) {
+    Reader r(src, j, place);
+    LibraryTrack t;
+    t.title = r.required_text("title");
+    t.artist = r.text("artist", "Unknown Artist");
+    t.album = r.text("album", "Unknown Album");
+    t.genre = r.text("genre", "");
+    t.composer = r.text("composer", "");
+    t.length_ms = static_cast<int32_t>(r.integer("length_ms", 180000, 1, INT32_MAX));
+    t.audiobook = r.flag("audiobook", false);
+    t.podcast = r.flag("podcast", false);
+    t.itunes_u = r.flag("itunes_u", false);
+    r.finish();
+    return t;
+}
+
+std::vector<LibraryTrack> read_library_tracks(const Source &src, Reader &r, const char *key) {
+    std::vector<LibraryTrack> tracks;
+    if (const json *list = r.array(key))
+        for (size_t i = 0; i < list->size(); ++i)
+            tracks.push_back(read_library_track(src, (*list)[i], item_place(r.place(key), i)));
+    return tracks;
+}
+
+std::vector<std::string> read_titles(const Source &src, Reader &r, const char *key) {
+    std::vector<std::string> titles;
+    if (const json *list = r.array(key)) {
+        for (size_t i = 0; i < list->size(); ++i) {
+            const json &t = (*list)[i];
+            if (!t.is_string())
+                src.fail(item_place(r.place(key), i),
+                         std::string("expected a track title, found ") + kind_name(t));
+            titles.push_back(t.get<std::string>());
+        }
+    }
+    return titles;
+}
+
+// Stable seed of a generated library: the same serial always gets the same library.
+uint32_t serial_seed(const std::string &serial) {
+    uint32_t h = 2166136261u;
+    for (unsigned char c : serial) h = (h ^ c) * 16777619u;
+    return h;
+}
+
+constexpr int32_t kDefaultLibraryTracks = 300;
+
+// The library, the queue's tracks (which it must hold, so that they have identifiers) and
+// its timed changes.
+void read_library(const Source &src, const json *j, const std::string &place, DeviceSpec &d) {
+    std::optional<Reader> r;
+    if (j != nullptr) r.emplace(src, *j, place);
+    const uint32_t seed =
+        r ? static_cast<uint32_t>(r->integer("seed", serial_seed(d.serial), 0, UINT32_MAX))
+          : serial_seed(d.serial);
+    const int32_t generated =
+        r ? static_cast<int32_t>(
+                r->integer("generate", j->contains("tracks") ? 0 : kDefaultLibraryTracks, 0, 20000))
+          : kDefaultLibraryTracks;
+    d.library = MediaLibrary::generate(seed, generated);
+    d.library.mlid =
+        r ? r->text("mlid", "SIMLIB-" + d.serial, MAXIMUM_MLID_LENGTH - 1) : "SIMLIB-" + d.serial;
+    if (r) d.library.genius_available = r->flag("genius", true);
+    for (Track &t : d.tracks) {
+        LibraryTrack lt;
+        lt.title = t.title;
+        lt.artist = t.artist;
+        lt.album = t.album;
+        lt.genre = t.genre;
+        lt.composer = t.composer;
+        lt.length_ms = t.length_ms;
+        lt.audiobook = t.audiobook;
+        t.uid = d.library.add_track(std::move(lt));
+    }
+    if (!r) return;
+    for (LibraryTrack &t : read_library_tracks(src, *r, "tracks"))
+        d.library.add_track(std::move(t));
+    if (const json *lists = r->array("playlists")) {
+        for (size_t i = 0; i < lists->size(); ++i) {
+            const std::string list_place = item_place(r->place("playlists"), i);
+            Reader pr(src, (*lists)[i], list_place);
+            Playlist p;
+            p.name = pr.required_text("name");
+            p.genius = pr.flag("genius", false);
+            for (const std::string &title : read_titles(src, pr, "tracks")) {
+                uint64_t uid = d.library.identifier(kCategoryTrack, title);
+                if (uid == 0) src.fail(pr.place("tracks"), "no track titled \"" + title + "\"");
+                p.tracks.push_back(uid);
+            }
+            pr.finish();
+            d.library.add_playlist(std::move(p));
+        }
+    }
+    if (const json *changes = r->array("changes")) {
+        for (size_t i = 0; i < changes->size(); ++i) {
+            Reader cr(src, (*changes)[i], item_place(r->place("changes"), i));
+            TimedLibraryChange change;
+            change.at_ms = cr.integer("at_ms", 0, 0, INT64_MAX / 4);
+            change.insert = read_library_tracks(src, cr, "insert");
+            change.remove = read_titles(src, cr, "delete");
+            cr.finish();
+            d.library_changes.push_back(std::move(change));
+        }
+    }
+    r->finish();
 }
 
 PlayerState read_playback(const Source &src, const json &j, const std::string &place,
@@ -285,6 +391,7 @@ DeviceSpec read_device(const Source &src, const json &j, const std::string &plac
         d.player = read_playback(src, r.raw("playback"), r.place("playback"), d.tracks);
     if (r.has("artwork")) d.artwork = read_artwork(src, r.raw("artwork"), r.place("artwork"));
     read_accessory(r, d.accessory);
+    read_library(src, r.has("library") ? &r.raw("library") : nullptr, r.place("library"), d);
     r.finish();
     return d;
 }

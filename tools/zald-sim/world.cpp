@@ -86,6 +86,28 @@ void World::start() {
         if (device->present && !device->authenticated) authenticate(*device);
         run_battery(*device);
     }
+    // Scenario changes of the libraries, each pushed to a running update stream.
+    for (auto &device : devices_) {
+        for (const TimedLibraryChange &change : device->spec.library_changes) {
+            const int32_t id = device->id;
+            host_.after(change.at_ms, [this, id, change] {
+                Device *d = by_id(id);
+                if (d == nullptr) return;
+                MediaLibrary &library = d->spec.library;
+                if (!change.remove.empty()) {
+                    std::vector<uint64_t> uids;
+                    for (const std::string &title : change.remove)
+                        for (const LibraryTrack &t : library.tracks())
+                            if (t.title == title) uids.push_back(t.uid);
+                    library.remove(uids);
+                }
+                if (!change.insert.empty()) library.insert(change.insert);
+                SIM_LOGI("zald-sim: library of %s now at revision %u\n", d->spec.serial.c_str(),
+                         library.revision);
+                if (d->present) push_library_updates(*this, *d);
+            });
+        }
+    }
 }
 
 std::vector<Device *> World::present() const {
@@ -360,6 +382,28 @@ bool World::set_repeat(Device &d, int32_t mode) {
         emit_int(d, "repeat_mode_changed", mode);
     }
     return true;
+}
+
+void World::play_queue(Device &d, const std::vector<const LibraryTrack *> &queue, int32_t start) {
+    std::vector<Track> tracks;
+    tracks.reserve(queue.size());
+    for (const LibraryTrack *t : queue) {
+        Track track;
+        track.title = t->title;
+        track.artist = t->artist;
+        track.album = t->album;
+        track.genre = t->genre;
+        track.composer = t->composer;
+        track.length_ms = t->length_ms;
+        track.audiobook = t->audiobook;
+        track.uid = t->uid;
+        tracks.push_back(std::move(track));
+    }
+    d.spec.tracks = std::move(tracks);
+    SIM_LOGI("zald-sim: device %s plays a queue of %zu tracks from %d\n", d.spec.serial.c_str(),
+             d.spec.tracks.size(), start);
+    move_to_track(d, start);
+    set_state(d, kPlaying);
 }
 
 void World::tick(Millis elapsed) {

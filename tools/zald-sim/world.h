@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "accessory.h"
+#include "media_library.h"
 #include "value_util.h"
 
 namespace sim {
@@ -83,10 +84,14 @@ struct DeviceSpec {
     Millis auth_delay_ms = 300;  // from arrival to the authentication outcome
     bool auth_succeeds = true;
     std::string playing_app = "Music";
-    std::vector<Track> tracks;
+    std::vector<Track> tracks;  // the play queue
     PlayerState player;
     ArtworkSpec artwork;
     AccessorySpec accessory;
+    // The media library (its changes over time included); a generated one when the
+    // scenario gives none. The queue's tracks are part of it.
+    MediaLibrary library;
+    std::vector<TimedLibraryChange> library_changes;
 };
 
 struct Device {
@@ -99,6 +104,7 @@ struct Device {
     PlayerState player;
     std::map<int32_t, int32_t> preferences;  // class -> value
     AccessoryState accessory;
+    MediaSession media;
     const Track *current_track() const;
     // The track with this persistent identifier, or null.
     const Track *track_by_uid(uint64_t uid) const;
@@ -170,6 +176,8 @@ class World {
     bool set_repeat(Device &d, int32_t mode);
     // Moves to the start of a chapter of the current track.
     bool set_chapter(Device &d, int32_t chapter);
+    // Replaces the play queue by library tracks and plays from start (index in the queue).
+    void play_queue(Device &d, const std::vector<const LibraryTrack *> &queue, int32_t start);
 
     // Playback clock: advances every playing device by elapsed milliseconds and pushes
     // their positions.
@@ -197,5 +205,9 @@ class World {
     std::vector<std::unique_ptr<Device>> devices_;
     WorldHost &host_;
 };
+
+// Pushes the library changes a device's update stream has not carried yet
+// (handlers_media.cpp); nothing while the stream is stopped.
+void push_library_updates(World &world, Device &device);
 
 }  // namespace sim
