@@ -170,8 +170,6 @@ void zal_copy_text(char *buffer, std::size_t size, const char *text) {
     const std::size_t length = text != nullptr ? strnlen(text, size - 1) : 0;
     if (length > 0) memcpy(buffer, text, length);
     buffer[length] = '\0';
-gval *zal_reply_value(const zal_ipod_reply *reply) {
-    return reply_value(reply);
 }
 
 bool zal_reply_error(zal_ipod_handle *h, const gval *hash) {

@@ -142,13 +142,7 @@ auto zal_cmd_sync_with(zal_ipod_handle *h, int tid, Decode &&decode) {
     reply_record_free(reply);
     return result;
 }
-// Reads an integer under key of a hash; fallback when absent or not an integer.
-int32_t zal_hash_int(const gval *hash, const char *key, int32_t fallback);
-// String under key, or nullptr.
-const char *zal_hash_string(const gval *hash, const char *key);
 
-// For decoders that read a reply record themselves: its decoded payload (nullptr without
-// one; the caller frees it), and the "error" text of a reply hash stored as the handle's
-// error text (true when there was one).
-gval *zal_reply_value(const zal_ipod_reply *reply);
+// For decoders that read a reply record themselves: the "error" text of a reply hash
+// stored as the handle's error text (true when there was one).
 bool zal_reply_error(zal_ipod_handle *h, const gval *hash);

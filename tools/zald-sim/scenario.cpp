@@ -204,6 +204,8 @@ ArtworkSpec read_artwork(const Source &src, const json &j, const std::string &pl
     a.pixel_format = static_cast<int32_t>(r.integer("pixel_format", 2, 2, 3));
     r.finish();
     return a;
+}
+
 LibraryTrack read_library_track(const Source &src, const json &j, const std::string &place) {
     Reader r(src, j, place);
     LibraryTrack t;
