@@ -278,6 +278,7 @@ void read_library(const Source &src, const json *j, const std::string &place, De
         lt.composer = t.composer;
         lt.length_ms = t.length_ms;
         lt.audiobook = t.audiobook;
+        lt.uid = t.uid;  // an identifier the scenario gave is kept (unless taken already)
         t.uid = d.library.add_track(std::move(lt));
     }
     if (!r) return;
