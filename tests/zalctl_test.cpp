@@ -231,6 +231,8 @@ TEST(ZalctlUsage, WrongCommandLinesExitWithTwo) {
         EXPECT_FALSE(r.err.empty()) << joined(args);
         EXPECT_EQ(r.out, "") << joined(args);
     }
+    EXPECT_EQ(zalctl({"--json", "bogus"}).err,
+              "zalctl: unknown command: bogus (see zalctl --help)\n");
 }
 
 TEST(ZalctlUsage, EverySubcommandHasHelp) {
