@@ -79,7 +79,6 @@ class Session {
     zal_ipod_handle *h_ = nullptr;
     EventHandler event_handler_;
     const char *last_error_ = nullptr;  // error text pointer before the current command
-    bool handler_failed_ = false;       // an event handler threw (the event was skipped)
 };
 
 // Registers what a subcommand does once the whole command line parsed without error.
