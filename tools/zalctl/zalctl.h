@@ -104,11 +104,17 @@ void add_status_commands(CLI::App &app, Session &s);     // status
 void add_transport_commands(CLI::App &app, Session &s);  // play, pause, ..., next, prev
 void add_config_commands(CLI::App &app, Session &s);     // config get / set
 void add_event_commands(CLI::App &app, Session &s);      // events
+// shuffle, repeat, seek, track, prefs get / set, artwork
+void add_playback_commands(CLI::App &app, Session &s);
 
-// Shared by status and transport: the current track through CURRENT_TRACK_INFO, as JSON
-// (title, artist, album, state, track_index, number_of_tracks, position_ms, length_ms).
+// Shared by status, transport and playback: the current track, as JSON (has_track, title,
+// artist, album, chapter, state, track_index, number_of_tracks, position_ms, length_ms,
+// shuffle, repeat).
 Json now_playing(Session &s);
 // One line for people: "paused  Title - Artist  [###...] 0:42 / 3:35  (1/4)".
 std::string now_playing_line(const Json &np);
+// The block status shows: one "label: value" line each for title, artist, album, chapter,
+// position (bar, time / length, track of tracks), state, shuffle and repeat.
+std::string now_playing_block(const Json &np);
 
 }  // namespace zalctl
