@@ -42,6 +42,7 @@ int main(int argc, char **argv) {
     add_config_commands(app, session);
     add_event_commands(app, session);
     add_playback_commands(app, session);
+    add_device_info_commands(app, session);
 
     try {
         app.parse(argc, argv);

@@ -106,6 +106,8 @@ void add_config_commands(CLI::App &app, Session &s);     // config get / set
 void add_event_commands(CLI::App &app, Session &s);      // events
 // shuffle, repeat, seek, track, prefs get / set, artwork
 void add_playback_commands(CLI::App &app, Session &s);
+// info, eq, button, voiceover, call-state, eap (commands_device.cpp)
+void add_device_info_commands(CLI::App &app, Session &s);
 
 // Shared by status, transport and playback: the current track, as JSON (has_track, title,
 // artist, album, chapter, state, track_index, number_of_tracks, position_ms, length_ms,
