@@ -2,7 +2,9 @@
 #include "client_fuzz_commands.h"
 
 #include <cstddef>
+#include <cstdlib>
 #include <cstring>
+#include <initializer_list>
 
 namespace {
 
@@ -99,6 +101,89 @@ const Command kCommands[] = {
         uint8_t data = 0;
         use(zal_ipod_get_playlist_info_sync(h, 0, 0, &data));
         use(data);
+    },
+    // Now playing.
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_info_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_sample_rate_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_is_audiobook_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_contains_video_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_play_state_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_device_current_draw_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_device_charge_if_power_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_current_track_index_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_shuffle_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_repeat_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_chapter_index_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_chapter_count_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_position_sync(h, 1000)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_track_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_current_playing_track_chapter_sync(h, 1)); },
+    [](zal_ipod_handle *h) {
+        use(zal_ipod_get_current_playing_track_chapter_play_status_sync(h, 0));
+    },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_shuffle_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_repeat_sync(h, 2)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_write_tag_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_color_display_image_limits_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_preference_sync(h, 8)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_preference_sync(h, 8, 9)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_ipod_preference_sync(h, 3)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_ipod_preference_sync(h, 3, 1)); },
+    [](zal_ipod_handle *h) {
+        serialize_free(zal_ipod_health_examine(h, "fuzz", serialize_int(1)));
+    },
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_artwork_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_current_track_pos_artwork_sync(h, 0, 1000)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_track_artwork_by_uid_sync(h, 0x0102030405060708ull)); },
+    [](zal_ipod_handle *h) {
+        int32_t *times = nullptr;
+        int32_t count = 0;
+        if (zal_ipod_current_track_artwork_times_sync(h, 0, &times, &count) == 1) {
+            for (int32_t i = 0; i < count; ++i) use(times[i]);
+            free(times);
+        }
+    },
+    // Accessory input and video out.
+    [](zal_ipod_handle *h) { use(zal_ipod_enter_videooutmode_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_videooutoptions_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_mode_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_launchapplication_sync(h, "app")); },
+    [](zal_ipod_handle *h) { use(zal_ipod_simple_contextbutton_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_rotation_input_sync(h, 1, 2, 3, 4, 5, 6, 7, 8)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_voiceover_event_sync(h, 0, 0, 0, 0, 0, 0, "x")); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_voiceover_parameter_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_current_voiceover_itemproperty_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_current_voiceover_itemproperty_sync(h, 3)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_register_descriptor_sync(h, 1, 2, 3, 4, 5)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_unregister_descriptor_sync(h, 1)); },
+    // Device information.
+    [](zal_ipod_handle *h) { use(zal_ipod_request_lingo_version_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(static_cast<long>(zal_ipod_get_lingo_options_sync(h, 0))); },
+    [](zal_ipod_handle *h) { use(zal_ipod_localization_info_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_current_eqprofile_index_sync(h)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_num_eqprofiles_sync(h)); },
+    [](zal_ipod_handle *h) {
+        char name[ZAL_EQPROFILE_NAME_SIZE];
+        if (zal_ipod_get_indexed_eqprofile_name_sync(h, 0, name) == 1)
+            use(static_cast<long>(strnlen(name, sizeof name)));
+    },
+    [](zal_ipod_handle *h) {
+        int state = 0, level = 0;
+        use(zal_ipod_get_power_battery_state_sync(h, &state, &level) + state + level);
+    },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_sound_check_state_sync(h)); },
+    [](zal_ipod_handle *h) {
+        char *status = zal_ipod_bt_connection_status_sync(h);
+        use_text(status);
+        free(status);
+    },
+    [](zal_ipod_handle *h) { use(zal_ipod_device_power_source_update_sync(h, 1, 2)); },
+    // Communications and vehicle integration.
+    [](zal_ipod_handle *h) { use(zal_ipod_start_telephony_callstate_information_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_send_eap_datagram_sync(h, 1, "abc", 3)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_send_vehicle_status_update_sync(h, 1, 2, 3, -4, 5)); },
+    [](zal_ipod_handle *h) {
+        use(zal_ipod_send_accessory_wifi_configuration_information(h, "ap", "pw", 1, 2));
     },
 };
 
@@ -218,4 +303,51 @@ void zal_fuzz_read_handle(zal_ipod_handle *h) {
     use(zal_ipod_get_result_db_device_uid(h)[7]);
     use(zal_ipod_get_result_db_last_sync_time(h)[6]);
     use(zal_ipod_get_result_db_itunes_info_count(h));
+    use_text(zal_ipod_current_track_title(h));
+    use_text(zal_ipod_current_track_chapter(h));
+    use_text(zal_ipod_current_track_artist(h));
+    use_text(zal_ipod_current_track_album(h));
+    use_text(zal_ipod_current_track_artwork_name(h));
+    use_text(zal_ipod_last_known_librevision(h));
+    use_text(zal_ipod_playing_app(h));
+    for (int (*get)(zal_ipod_handle *) : {zal_ipod_current_track_length,
+                                          zal_ipod_current_track_position,
+                                          zal_ipod_current_track_state,
+                                          zal_ipod_init_state,
+                                          zal_ipod_current_number_of_tracks,
+                                          zal_ipod_current_track_index,
+                                          zal_ipod_current_chapter_index,
+                                          zal_ipod_current_chapter_count,
+                                          zal_ipod_current_chapter_length,
+                                          zal_ipod_current_chapter_position,
+                                          zal_ipod_current_sample_rate,
+                                          zal_ipod_current_track_timestamp,
+                                          zal_ipod_current_track_timestamp_usec,
+                                          zal_ipod_current_track_has_artwork,
+                                          zal_ipod_current_track_has_chapters,
+                                          zal_ipod_current_shuffle_state,
+                                          zal_ipod_current_repeat_state,
+                                          zal_ipod_get_color_display_image_limits_maxImageWidth,
+                                          zal_ipod_get_color_display_image_limits_maxImageHeigh,
+                                          zal_ipod_get_color_display_image_limits_pixelFormat})
+        use(get(h));
+    // Every byte the artwork record says it holds is read.
+    const unsigned char *pixels = zal_ipod_current_track_artwork_data(h);
+    const uint32_t length = zal_ipod_current_track_artwork_length(h);
+    long sum = 0;
+    for (uint32_t i = 0; pixels != nullptr && i < length; ++i) sum += pixels[i];
+    use(sum);
+    use(zal_ipod_current_track_artwork_width(h) + zal_ipod_current_track_artwork_height(h) +
+        zal_ipod_current_track_artwork_rowstride(h) +
+        zal_ipod_current_track_artwork_pixel_format(h));
+    for (int type = -1; type <= 3; ++type) {
+        use(zal_ipod_voiceover_item_current_index(h, type));
+        use(zal_ipod_voiceover_item_last_index(h, type));
+        use_text(zal_ipod_voiceover_item_name(h, type));
+        use_text(zal_ipod_current_localization_info(h, type));
+    }
+    use(zal_ipod_voiceover_item_topleft_x(h) + zal_ipod_voiceover_item_topleft_y(h) +
+        zal_ipod_voiceover_item_bottomright_x(h) + zal_ipod_voiceover_item_bottomright_y(h));
+    use(zal_ipod_get_result_lingo_version_major(h) + zal_ipod_get_result_lingo_version_minor(h));
+    use_text(zal_ipod_get_result_lingo_version(h));
 }

@@ -294,7 +294,31 @@ INSTANTIATE_TEST_SUITE_P(
                     [] { return hash_of({{"config_val", serialize_string("zal.ipod.IPodDaemon")}}); },
                     [](zal_ipod_handle *h) {
                         return zal_ipod_get_config_sync(h, "socket_name", config_value) == 1;
-                    }}),
+                    }},
+        CommandCase{"get_mode", ZAL_OP_GET_MODE, [] { return serialize_int(1); },
+                    [](zal_ipod_handle *h) { return zal_ipod_get_mode_sync(h) == 1; }},
+        CommandCase{"power_battery_state", ZAL_OP_GET_POWER_BATTERY_STATE,
+                    [] {
+                        return hash_of({{"get_power_battery_state", serialize_int(1)},
+                                        {"state", serialize_int(2)},
+                                        {"level", serialize_int(55)}});
+                    },
+                    [](zal_ipod_handle *h) {
+                        int state = 0, level = 0;
+                        return zal_ipod_get_power_battery_state_sync(h, &state, &level) == 1 &&
+                               level == 55;
+                    }},
+        CommandCase{"bt_connection_status", ZAL_OP_GET_BT_CONNECTION_STATUS,
+                    [] { return hash_of({{"current_bt_status", serialize_string("connected")}}); },
+                    [](zal_ipod_handle *h) {
+                        char *status = zal_ipod_bt_connection_status_sync(h);
+                        const bool ok = status != nullptr && strcmp(status, "connected") == 0;
+                        free(status);
+                        return ok;
+                    }},
+        CommandCase{"stop_telephony_update", ZAL_OP_STOP_TELEPHONY_UPDATE,
+                    [] { return serialize_int(0); },
+                    [](zal_ipod_handle *h) { return zal_ipod_stop_telephony_update_sync(h) == 0; }}),
     [](const auto &info) { return std::string(info.param.name); });
 
 TEST_F(AllocationFailure, EventDispatch) {

@@ -8,6 +8,7 @@
 #include "zal-ipod-2/command.h"
 #include "zal-ipod-2/media_db_state.h"
 #include "zal-ipod-2/packet.h"
+#include "zal-ipod-2/playback_state.h"
 
 zal_records_state::~zal_records_state() {
     serialize_free(records);
@@ -79,10 +80,6 @@ int32_t read_itunes_info(zal_ipod_handle *h, const gval *hash) {
 int32_t keep_record_count(zal_ipod_handle *h, int32_t result) {
     if (h != nullptr) h->records.record_count = result;
     return result;
-}
-
-int32_t decode_indexed_track_info(zal_ipod_handle *, const gval *hash) {
-    return zal_hash_int(hash, "indexed_track_info", -1);
 }
 
 // Track info layouts: identifiers only when the result is empty or starts with a byte
@@ -207,7 +204,7 @@ ZAL_API int zal_ipod_indexed_track_info(zal_ipod_handle *h, int index) {
                         &zal_pending_slots::indexed_track_info_tid);
 }
 ZAL_API int zal_ipod_indexed_track_info_sync(zal_ipod_handle *h, int index) {
-    return zal_cmd_sync_hash(h, zal_ipod_indexed_track_info(h, index), decode_indexed_track_info);
+    return zal_cmd_sync(h, zal_ipod_indexed_track_info(h, index), zal_decode_indexed_track_info);
 }
 
 ZAL_API int zal_ipod_get_db_itunes_info(zal_ipod_handle *h, int type) {
