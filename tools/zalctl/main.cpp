@@ -41,6 +41,7 @@ int main(int argc, char **argv) {
     add_transport_commands(app, session);
     add_config_commands(app, session);
     add_event_commands(app, session);
+    add_media_commands(app, session);
 
     try {
         app.parse(argc, argv);

@@ -105,6 +105,7 @@ void add_status_commands(CLI::App &app, Session &s);     // status
 void add_transport_commands(CLI::App &app, Session &s);  // play, pause, ..., next, prev
 void add_config_commands(CLI::App &app, Session &s);     // config get / set
 void add_event_commands(CLI::App &app, Session &s);      // events
+void add_media_commands(CLI::App &app, Session &s);      // db, library, playlist, play-items
 
 // Shared by status and transport: the current track through CURRENT_TRACK_INFO, as JSON
 // (title, artist, album, state, track_index, number_of_tracks, position_ms, length_ms).
