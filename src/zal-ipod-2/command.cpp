@@ -162,6 +162,10 @@ const char *zal_hash_string(const gval *hash, const char *key) {
     return zal_kind(v) == SERIALIZE_STRING ? serialize_get_string(v) : nullptr;
 }
 
+bool zal_reply_error(zal_ipod_handle *h, const gval *hash) {
+    return zal_kind(hash) == SERIALIZE_HASH && take_error(h, hash);
+}
+
 bool zal_flag_set(const gval *hash, const char *key) {
     return zal_hash_int(hash, key, 0) != 0;
 }
@@ -170,8 +174,4 @@ void zal_copy_text(char *buffer, std::size_t size, const char *text) {
     const std::size_t length = text != nullptr ? strnlen(text, size - 1) : 0;
     if (length > 0) memcpy(buffer, text, length);
     buffer[length] = '\0';
-}
-
-bool zal_reply_error(zal_ipod_handle *h, const gval *hash) {
-    return zal_kind(hash) == SERIALIZE_HASH && take_error(h, hash);
 }

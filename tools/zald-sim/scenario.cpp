@@ -194,18 +194,6 @@ Track read_track(const Source &src, const json &j, const std::string &place) {
     return t;
 }
 
-ArtworkSpec read_artwork(const Source &src, const json &j, const std::string &place) {
-    Reader r(src, j, place);
-    ArtworkSpec a;
-    static const std::vector<const char *> kDelivery = {"file", "inline"};
-    a.shared_file = r.choice("delivery", kDelivery, 0) == 0;
-    a.width = static_cast<int32_t>(r.integer("width", 240, 1, 1024));
-    a.height = static_cast<int32_t>(r.integer("height", 240, 1, 1024));
-    a.pixel_format = static_cast<int32_t>(r.integer("pixel_format", 2, 2, 3));
-    r.finish();
-    return a;
-}
-
 LibraryTrack read_library_track(const Source &src, const json &j, const std::string &place) {
     Reader r(src, j, place);
     LibraryTrack t;
@@ -253,8 +241,8 @@ uint32_t serial_seed(const std::string &serial) {
 
 constexpr int32_t kDefaultLibraryTracks = 300;
 
-// The library, the queue's tracks (which it must hold, so that they have identifiers) and
-// its timed changes.
+// The library and its timed changes (the play queue's tracks join it in the world, with
+// their identifiers).
 void read_library(const Source &src, const json *j, const std::string &place, DeviceSpec &d) {
     std::optional<Reader> r;
     if (j != nullptr) r.emplace(src, *j, place);
@@ -269,18 +257,6 @@ void read_library(const Source &src, const json *j, const std::string &place, De
     d.library.mlid =
         r ? r->text("mlid", "SIMLIB-" + d.serial, MAXIMUM_MLID_LENGTH - 1) : "SIMLIB-" + d.serial;
     if (r) d.library.genius_available = r->flag("genius", true);
-    for (Track &t : d.tracks) {
-        LibraryTrack lt;
-        lt.title = t.title;
-        lt.artist = t.artist;
-        lt.album = t.album;
-        lt.genre = t.genre;
-        lt.composer = t.composer;
-        lt.length_ms = t.length_ms;
-        lt.audiobook = t.audiobook;
-        lt.uid = t.uid;  // an identifier the scenario gave is kept (unless taken already)
-        t.uid = d.library.add_track(std::move(lt));
-    }
     if (!r) return;
     for (LibraryTrack &t : read_library_tracks(src, *r, "tracks"))
         d.library.add_track(std::move(t));
@@ -312,6 +288,18 @@ void read_library(const Source &src, const json *j, const std::string &place, De
         }
     }
     r->finish();
+}
+
+ArtworkSpec read_artwork(const Source &src, const json &j, const std::string &place) {
+    Reader r(src, j, place);
+    ArtworkSpec a;
+    static const std::vector<const char *> kDelivery = {"file", "inline"};
+    a.shared_file = r.choice("delivery", kDelivery, 0) == 0;
+    a.width = static_cast<int32_t>(r.integer("width", 240, 1, 1024));
+    a.height = static_cast<int32_t>(r.integer("height", 240, 1, 1024));
+    a.pixel_format = static_cast<int32_t>(r.integer("pixel_format", 2, 2, 3));
+    r.finish();
+    return a;
 }
 
 PlayerState read_playback(const Source &src, const json &j, const std::string &place,
