@@ -1,6 +1,8 @@
 // Now playing: the now-playing block that status and the transport commands show, the
 // shuffle and repeat modes, seek, track, device preferences, and the artwork written as PNG.
+#ifdef ZALCTL_HAVE_PNG
 #include <png.h>
+#endif
 
 #include <cerrno>
 #include <cstdio>
@@ -84,6 +86,7 @@ File open_output(const std::string &path) {
     return f;
 }
 
+#ifdef ZALCTL_HAVE_PNG
 // Writes width x height 16-bit pixels (rows stride bytes apart) as an 8-bit RGB PNG.
 void write_png(const std::string &path, const unsigned char *pixels, uint32_t width,
                uint32_t height, uint32_t stride, bool big_endian) {
@@ -124,6 +127,14 @@ void write_png(const std::string &path, const unsigned char *pixels, uint32_t wi
     if (fflush(f.get()) != 0)
         throw Failure("artwork: cannot write " + path + ": " + strerror(errno));
 }
+#else
+// Writes width x height 16-bit pixels (rows stride bytes apart) as an 8-bit RGB PNG.
+void write_png(const std::string &path, const unsigned char *pixels, uint32_t width,
+               uint32_t height, uint32_t stride, bool big_endian) {
+    (void)path, (void)pixels, (void)width, (void)height, (void)stride, (void)big_endian;
+    throw Failure("artwork: this zalctl was built without libpng and cannot write PNG files");
+}
+#endif
 
 void write_raw(const std::string &path, const unsigned char *bytes, uint32_t length) {
     File f = open_output(path);
