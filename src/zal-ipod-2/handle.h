@@ -10,6 +10,7 @@
 #include <cstdint>
 
 #include "zal-ipod-2/zal-ipod-2.h"
+#include "zal-ipod-2/browser_state.h"
 #include "zal-ipod-2/family_state.h"
 #include "zal-ipod-2/media_db_state.h"
 #include "zal-ipod-2/playback_state.h"
@@ -99,6 +100,7 @@ struct zal_ipod_handle {
     int32_t protocol = 0;
     zal_artwork_state artwork;
     zal_records_state records;
+    zal_browser_state browser;
 
     // Event thread.
     pthread_t loop_thread{};

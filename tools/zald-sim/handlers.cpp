@@ -21,6 +21,7 @@ HandlerTable make_handler_table() {
     register_transport_handlers(table);
     register_playback_handlers(table);
     register_media_handlers(table);
+    register_browse_handlers(table);
     return table;
 }
 

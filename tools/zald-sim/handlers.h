@@ -56,5 +56,6 @@ void register_core_handlers(HandlerTable &table);
 void register_transport_handlers(HandlerTable &table);
 void register_playback_handlers(HandlerTable &table);
 void register_media_handlers(HandlerTable &table);
+void register_browse_handlers(HandlerTable &table);
 
 }  // namespace sim
