@@ -101,10 +101,26 @@ bool is_tag(unsigned char tag) {
 gval *decode_array(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth);
 gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth);
 
+// Set by any allocation that failed during the current decode on this thread. A short
+// input ends a container quietly (that is what the daemon sent), but a tree cut short for
+// want of memory would look just as whole: the public readers drop it and say so.
+thread_local bool decode_out_of_memory = false;
+
+template <class T>
+T *allocated(T *p) {
+    if (p == nullptr) decode_out_of_memory = true;
+    return p;
+}
+
+bool allocated(bool ok) {
+    if (!ok) decode_out_of_memory = true;
+    return ok;
+}
+
 gval *decode_scalar(uint32_t kind, const unsigned char *p, uint64_t remaining, uint64_t *consumed) {
     if (remaining < 5) return nullptr;
     uint32_t bits = get_be32(p + 1);  // big-endian on the wire
-    gval *v = value_new_blob(kind, &bits, 4);
+    gval *v = allocated(value_new_blob(kind, &bits, 4));
     if (v != nullptr) *consumed += 1 + static_cast<uint64_t>(p[0]);
     return v;
 }
@@ -113,7 +129,7 @@ gval *decode_blob(uint32_t kind, const unsigned char *p, uint64_t remaining, uin
     if (remaining < 4) return nullptr;
     uint32_t n = get_be32(p);
     if (n > remaining - 4) return nullptr;
-    gval *v = value_new_blob(kind, p + 4, n);
+    gval *v = allocated(value_new_blob(kind, p + 4, n));
     if (v != nullptr) *consumed += 4 + static_cast<uint64_t>(n);
     return v;
 }
@@ -157,16 +173,17 @@ uint32_t plausible_count(uint32_t count, uint64_t remaining, uint64_t min_size) 
 
 gval *decode_array(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth) {
     if (depth > kMaxDepth) return nullptr;
-    gval *array = serialize_array();
+    gval *array = allocated(serialize_array());
     if (array == nullptr) return nullptr;
     uint32_t count = 0;
     uint64_t pos = 8;
     if (container_header(p, remaining, &count) &&
-        value_array_presize(array, plausible_count(count, remaining, kMinElementSize))) {
+        allocated(value_array_presize(array, plausible_count(count, remaining, kMinElementSize)))) {
         for (uint32_t i = 0; i < count && pos < remaining; ++i) {
             uint64_t used = 0;
             gval *item = decode_tagged(p[pos], p + pos + 1, remaining - pos - 1, &used, depth + 1);
-            if (item == nullptr || serialize_array_add(array, item) != 0) break;
+            if (item == nullptr) break;
+            if (!allocated(serialize_array_add(array, item) == 0)) break;
             pos += 1 + used;
         }
     }
@@ -229,12 +246,12 @@ char *copy_key(const unsigned char *bytes, uint64_t length, std::size_t *kept) {
 
 gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth) {
     if (depth > kMaxDepth) return nullptr;
-    gval *hash = serialize_hash();
+    gval *hash = allocated(serialize_hash());
     if (hash == nullptr) return nullptr;
     uint32_t count = 0;
     uint64_t pos = 8;
     if (container_header(p, remaining, &count) &&
-        value_hash_presize(hash, plausible_count(count, remaining, kMinEntrySize))) {
+        allocated(value_hash_presize(hash, plausible_count(count, remaining, kMinEntrySize)))) {
         KeyIndex keys;
         for (uint32_t i = 0; i < count && pos < remaining; ++i) {
             if (remaining - pos < 2) break;
@@ -250,7 +267,7 @@ gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed
             if (value == nullptr) break;
             pos += used;
             std::size_t kept = 0;
-            char *key = copy_key(key_bytes, key_length, &kept);
+            char *key = allocated(copy_key(key_bytes, key_length, &kept));
             if (key == nullptr) {
                 serialize_free(value);
                 break;
@@ -263,12 +280,13 @@ gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed
                 continue;
             }
             if (at == -2) {
+                decode_out_of_memory = true;
                 std::free(key);
                 serialize_free(value);
                 break;
             }
             at = value_hash_append_owned(hash, key, value);
-            if (at < 0) break;
+            if (!allocated(at >= 0)) break;
             keys.added(at, print);
         }
     }
@@ -281,7 +299,13 @@ gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed
 template <class Decode>
 gval *public_reader(uint32_t *consumed, Decode &&decode) {
     uint64_t used = 0;
+    decode_out_of_memory = false;
     gval *v = decode(&used);
+    if (decode_out_of_memory) {
+        ZAL_LOGE("unserialize: out of memory, value dropped\n");
+        serialize_free(v);
+        return nullptr;
+    }
     if (v != nullptr && consumed != nullptr) *consumed += static_cast<uint32_t>(used);
     return v;
 }
@@ -386,8 +410,9 @@ ZAL_API unsigned char *serialize(const gval *v, uint32_t *len) {
 
 ZAL_API gval *unserialize(const unsigned char *buf, uint32_t len) {
     if (buf == nullptr || len == 0 || !is_tag(buf[0])) return nullptr;
-    uint64_t used = 0;
-    return decode_tagged(buf[0], buf + 1, len - 1, &used, 1);
+    return public_reader(nullptr, [&](uint64_t *used) {
+        return decode_tagged(buf[0], buf + 1, len - 1, used, 1);
+    });
 }
 
 ZAL_API gval *serialize_int_unpack(const unsigned char *p, uint32_t remaining, uint32_t *consumed) {

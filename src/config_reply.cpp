@@ -61,7 +61,15 @@ int32_t get_reply_result(const gval *reply, char *out) {
     if (v != nullptr && serialize_type(v) == SERIALIZE_STRING) {
         if (out == nullptr) return kNoConfigValue;
         const char *text = serialize_get_string(v);
-        std::memcpy(out, text, std::strlen(text) + 1);
+        // The caller's room is fixed by the API; a longer value from a confused or hostile
+        // daemon is refused whole rather than cut (a cut path or key would look valid).
+        const std::size_t size = std::strlen(text) + 1;
+        if (size > ZAL_IPOD_CONFIG_VALUE_SIZE) {
+            ZAL_LOGE("config value of %zu bytes refused (room: %d)\n", size,
+                     ZAL_IPOD_CONFIG_VALUE_SIZE);
+            return kNoConfigValue;
+        }
+        std::memcpy(out, text, size);
         return 1;
     }
     int32_t code = 0;

@@ -5,6 +5,7 @@
 #include <cstdint>
 
 #include "zal-ipod-2/serialize.h"
+#include "zal-ipod-2/zal-ipod-2.h"
 
 namespace zal::config {
 

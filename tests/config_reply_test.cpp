@@ -12,6 +12,7 @@
 #include "config_reply.h"
 #include "log_capture.h"
 #include "value_builders.h"
+#include "zal-ipod-2/zal-ipod-2.h"
 
 namespace {
 
@@ -102,6 +103,10 @@ struct GetRow {
     std::optional<std::string> out;  // nullopt: the buffer is untouched
 };
 
+// The caller's buffer holds ZAL_IPOD_CONFIG_VALUE_SIZE bytes, terminator included.
+const std::string kLongestValue(ZAL_IPOD_CONFIG_VALUE_SIZE - 1, 'v');
+const std::string kTooLongValue(ZAL_IPOD_CONFIG_VALUE_SIZE, 'v');
+
 const GetRow kGetRows[] = {
     {"value", {{"config_val", "zal.ipod.IPodDaemon"}}, 1, "zal.ipod.IPodDaemon"},
     {"empty value", {{"config_val", ""}}, 1, ""},
@@ -111,6 +116,8 @@ const GetRow kGetRows[] = {
     {"neither", {{"other", 3}}, -2, std::nullopt},
     {"value of another kind", {{"config_val", 3}, {"config_val_errorcode", -7}}, -7, std::nullopt},
     {"error code of another kind", {{"config_val_errorcode", "-4"}}, -2, std::nullopt},
+    {"longest value that fits", {{"config_val", kLongestValue.c_str()}}, 1, kLongestValue},
+    {"value one byte too long", {{"config_val", kTooLongValue.c_str()}}, -2, std::nullopt},
 };
 
 void PrintTo(const GetRow &row, std::ostream *os) {
@@ -122,7 +129,7 @@ class GetConfigReply : public testing::TestWithParam<GetRow> {};
 TEST_P(GetConfigReply, GivesResultAndValue) {
     const GetRow &row = GetParam();
     GvalPtr reply = make_hash(row.reply);
-    char out[64];
+    char out[ZAL_IPOD_CONFIG_VALUE_SIZE];
     std::memset(out, '#', sizeof out);
     out[sizeof out - 1] = '\0';
     const std::string untouched(out);

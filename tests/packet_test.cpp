@@ -212,7 +212,12 @@ TEST(Reader, OversizedLengthDropsTheConnection) {
     zal_ipod_handle *h = connect_to(d);
     ASSERT_NE(h, nullptr);
     ASSERT_TRUE(d.finish());
-    Bytes bad = hex("fe 00 00 05 03 00 00 00");
+    // A whole reply, then a header announcing too much, in one write.
+    gval *zero = serialize_int(0);
+    Bytes bad = frame(7, ZAL_OP_RETURN, zero);
+    serialize_free(zero);
+    Bytes header = hex("fe 00 00 05 03 00 00 00");
+    bad.insert(bad.end(), header.begin(), header.end());
     uint32_t length = kMaxPayloadLength + 1;
     for (int shift : {24, 16, 8, 0}) bad.push_back(static_cast<unsigned char>(length >> shift));
     d.write_now(bad);
@@ -225,7 +230,8 @@ TEST(Reader, OversizedLengthDropsTheConnection) {
         return t.find("the stream is broken") != std::string::npos;
     }));
     EXPECT_EQ(count_starting(errors, "Could not find to zal.ipod.IPodDaemon"), 1);  // reconnect ran
-    EXPECT_EQ(h->queue_count.load(), 0);
+    // The reply before the broken header stays queued (and is released with the handle).
+    EXPECT_EQ(h->queue_count.load(), 1);
     EXPECT_EQ(zal_ipod_fd(h), -1);
     zal_ipod_close(h);
 }

@@ -1,10 +1,12 @@
-/*
+/**
+ * @file
  * Opcode numbers of the daemon protocol (the one-byte opcode of every packet header).
  * get_function_string() returns the name of opcodes 0 .. ZAL_OP_NAMED_COUNT - 1.
  */
 #ifndef ZAL_IPOD_2_OPCODES_H
 #define ZAL_IPOD_2_OPCODES_H
 
+/** Opcodes: the one-byte opcode of a packet header (zal_ipod_reply::opcode). */
 enum {
     ZAL_OP_HELLO = 0,
     ZAL_OP_KEEP_ALIVE = 1,
@@ -139,12 +141,12 @@ enum {
     ZAL_OP_GET_COLLECTION_ID = 130,
     ZAL_OP_SET_CONFIG = 131,
     ZAL_OP_GET_CONFIG = 132,
-    /* Sent without a name: the client tells the daemon it is attached. */
+    /** Sent without a name: the client tells the daemon it is attached. */
     ZAL_OP_NOTIFY_ATTACHED = 133,
-    /* Sent without a name: Wi-Fi configuration for wireless projection. */
+    /** Sent without a name: Wi-Fi configuration for wireless projection. */
     ZAL_OP_SEND_ACCESSORY_WIFI_CONFIGURATION = 134,
 
-    /* Opcodes below this number have a name in get_function_string(). */
+    /** Opcodes below this number have a name in get_function_string(). */
     ZAL_OP_NAMED_COUNT = 133
 };
 

@@ -3,6 +3,8 @@
 
 #include <android/log.h>
 
+#include <cstring>
+
 #include "common/log.h"
 #include "zal-ipod-2/packet.h"
 
@@ -18,7 +20,7 @@ int zal_cmd_send(zal_ipod_handle *h, uint16_t opcode, gval *arg, const char *fun
         return 0;
     }
     if (function != nullptr && arg == nullptr) {
-        ZAL_LOGE("%s: out of memory for the argument\n", function);
+        ZAL_LOGE("%s: the argument could not be built (out of memory or invalid)\n", function);
         return 0;
     }
     zal_ipod_send_record record{};
@@ -44,6 +46,11 @@ gval *zal_arg_bytes(const void *p, uint32_t n) {
 }
 gval *zal_arg_struct(const void *p, uint32_t n) {
     return serialize_struct(p, n);
+}
+
+gval *zal_arg_byte_string(const void *p, int32_t n) {
+    if (n < 0 || (p == nullptr && n > 0)) return nullptr;
+    return serialize_bytes(n > 0 ? p : "", static_cast<uint32_t>(n));
 }
 
 gval *zal_arg_ints(std::initializer_list<int32_t> items) {
@@ -103,12 +110,6 @@ gval *zal_arg_ints_strings(std::initializer_list<int32_t> ints, const char *cons
 }
 
 namespace {
-// Decodes the reply's payload; nullptr when there is none.
-gval *reply_value(const zal_ipod_reply *reply) {
-    if (reply == nullptr || reply->length == 0 || reply->payload == nullptr) return nullptr;
-    return unserialize(reply->payload, reply->length);
-}
-
 // Stores the "error" text of a hash; true when there was one.
 bool take_error(zal_ipod_handle *h, const gval *hash) {
     gval *error = serialize_hash_get(hash, "error");
@@ -119,8 +120,13 @@ bool take_error(zal_ipod_handle *h, const gval *hash) {
 }
 }  // namespace
 
+gval *zal_reply_value(const zal_ipod_reply *reply) {
+    if (reply == nullptr || reply->length == 0 || reply->payload == nullptr) return nullptr;
+    return unserialize(reply->payload, reply->length);
+}
+
 int32_t zal_decode_int(zal_ipod_handle *h, const zal_ipod_reply *reply) {
-    gval *v = reply_value(reply);
+    gval *v = zal_reply_value(reply);
     int32_t result = -1;
     if (zal_kind(v) == SERIALIZE_INT)
         result = serialize_get_int(v);
@@ -130,12 +136,22 @@ int32_t zal_decode_int(zal_ipod_handle *h, const zal_ipod_reply *reply) {
     return result;
 }
 
-int32_t zal_decode_hash(zal_ipod_handle *h, const zal_ipod_reply *reply, zal_hash_reader read) {
-    gval *v = reply_value(reply);
-    int32_t result = -1;
-    if (zal_kind(v) == SERIALIZE_HASH && !take_error(h, v)) result = read(h, v);
+gval *zal_reply_hash(zal_ipod_handle *h, const zal_ipod_reply *reply) {
+    gval *v = zal_reply_value(reply);
+    if (zal_kind(v) == SERIALIZE_HASH && !take_error(h, v)) return v;
     serialize_free(v);
-    return result;
+    return nullptr;
+}
+
+int32_t zal_decode_hash(zal_ipod_handle *h, const zal_ipod_reply *reply, zal_hash_reader read) {
+    return zal_decode_hash_with(h, reply, read);
+}
+
+int32_t zal_decode_flagged_int(zal_ipod_handle *h, const zal_ipod_reply *reply, const char *flag,
+                               const char *key) {
+    return zal_decode_flagged(h, reply, flag, [key](zal_ipod_handle *, const gval *hash) {
+        return zal_hash_int(hash, key, -1);
+    });
 }
 
 int32_t zal_cmd_sync(zal_ipod_handle *h, int tid, zal_record_decoder decode) {
@@ -149,7 +165,7 @@ int32_t zal_cmd_sync(zal_ipod_handle *h, int tid, zal_record_decoder decode) {
 gval *zal_cmd_sync_value(zal_ipod_handle *h, int tid) {
     if (h == nullptr) return nullptr;
     zal_ipod_reply *reply = zal_ipod_wait_for_tid_ex(h, static_cast<uint16_t>(tid));
-    gval *v = reply_value(reply);
+    gval *v = zal_reply_value(reply);
     reply_record_free(reply);
     return v;
 }
@@ -174,4 +190,14 @@ int32_t zal_hash_int(const gval *hash, const char *key, int32_t fallback) {
 const char *zal_hash_string(const gval *hash, const char *key) {
     gval *v = zal_kind(hash) == SERIALIZE_HASH ? serialize_hash_get(hash, key) : nullptr;
     return zal_kind(v) == SERIALIZE_STRING ? serialize_get_string(v) : nullptr;
+}
+
+bool zal_flag_set(const gval *hash, const char *key) {
+    return zal_hash_int(hash, key, 0) != 0;
+}
+
+void zal_copy_text(char *buffer, std::size_t size, const char *text) {
+    const std::size_t length = text != nullptr ? strnlen(text, size - 1) : 0;
+    if (length > 0) memcpy(buffer, text, length);
+    buffer[length] = '\0';
 }

@@ -175,6 +175,9 @@ int zal_ipod_reconnect(zal_ipod_handle *h) {
         return -1;
     }
     zal_connection_install(h, fd, remote);
+    // Before the HELLO: a connection that fails again inside it is then reported as lost
+    // after this, so the last report matches the state.
+    h->connection_changes.fetch_or(kConnectionRestored);
     hello_exchange(h);
     h->reconnecting = false;
     return fd;

@@ -5,6 +5,7 @@
 
 #include <pthread.h>
 #include <sched.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cstdlib>
@@ -300,10 +301,43 @@ zal_ipod_reply *take_dispatchable(zal_ipod_handle *h) {
     return taken;
 }
 
+// Pause of the loop thread between passes while there is no connection, so that a
+// daemon that is gone costs a reconnect attempt per pause rather than a busy loop.
+constexpr int kLoopRetryMillis = 500;
+constexpr int kLoopStopCheckMillis = 50;
+
 void *callbackThread(void *arg) {
     auto *h = static_cast<zal_ipod_handle *>(arg);
-    while (h->loop_stop.load() == 0) zal_ipod_events_iterate(h);
+    while (h->loop_stop.load() == 0) {
+        zal_ipod_events_iterate(h);
+        for (int waited = 0; waited < kLoopRetryMillis && h->fd.load() < 0 &&
+                             h->loop_stop.load() == 0;
+             waited += kLoopStopCheckMillis)
+            usleep(kLoopStopCheckMillis * 1000);
+    }
     return nullptr;
+}
+
+// Tells the connection callback what changed since the last report: a loss when the
+// application still believes it is connected, a reconnect when the connection is up now.
+void report_connection_changes(zal_ipod_handle *h) {
+    if (h->connection_changes.load() == 0) return;
+    bool idle = false;
+    if (!h->reporting_connection.compare_exchange_strong(idle, true)) return;
+    unsigned changes;
+    while ((changes = h->connection_changes.exchange(0)) != 0) {
+        zal_ipod_connection_cb cb = h->connection_cb.load();
+        void *user = h->connection_cb_data.load();
+        if ((changes & kConnectionLost) != 0 && h->reported_up.load()) {
+            h->reported_up = false;
+            if (cb != nullptr) cb(h, ZALIPOD_CONNECTION_LOST, user);
+        }
+        if ((changes & kConnectionRestored) != 0 && h->fd.load() >= 0 && !h->reported_up.load()) {
+            h->reported_up = true;
+            if (cb != nullptr) cb(h, ZALIPOD_CONNECTION_RESTORED, user);
+        }
+    }
+    h->reporting_connection = false;
 }
 
 }  // namespace
@@ -317,6 +351,7 @@ extern "C" {
 
 ZAL_API void zal_ipod_pending_event(zal_ipod_handle *h) {
     if (h == nullptr) return;
+    report_connection_changes(h);
     while (zal_ipod_reply *r = take_dispatchable(h)) {
         while (r != nullptr) {
             zal_ipod_reply *next = r->next;
@@ -336,6 +371,13 @@ ZAL_API void zal_ipod_set_event_cb(zal_ipod_handle *h, zal_ipod_event_cb cb, voi
     h->event_cb = cb;
 }
 
+ZAL_API void zal_ipod_set_connection_cb(zal_ipod_handle *h, zal_ipod_connection_cb cb,
+                                        void *user) {
+    if (h == nullptr) return;
+    h->connection_cb_data = user;
+    h->connection_cb = cb;
+}
+
 ZAL_API void zal_ipod_set_reply_cb(zal_ipod_handle *h, zal_ipod_reply_cb cb, void *user) {
     if (h == nullptr) return;
     h->reply_cb_data = user;
@@ -345,7 +387,10 @@ ZAL_API void zal_ipod_set_reply_cb(zal_ipod_handle *h, zal_ipod_reply_cb cb, voi
 ZAL_API int zal_ipod_read(zal_ipod_handle *h) {
     if (h == nullptr) return -1;
     int queued = zal_ipod_receive(h);
-    if (queued > 0) zal_ipod_pending_event(h);
+    if (queued > 0)
+        zal_ipod_pending_event(h);
+    else
+        report_connection_changes(h);
     return queued;
 }
 

@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "common/log.h"
 #include "zal-ipod-2/command.h"
 
 namespace {
@@ -73,17 +74,16 @@ ZAL_API const char *zal_ipod_event_get_serial(const zal_ipod_event *e) {
 ZAL_API zal_ipod_event *zal_ipod_event_clone_data(const zal_ipod_event *e) {
     if (e == nullptr) return nullptr;
     auto *copy = static_cast<zal_ipod_event *>(malloc(sizeof(zal_ipod_event)));
-    if (copy == nullptr) return nullptr;
-    memcpy(copy, e, sizeof *copy);
-    copy->data = nullptr;
-    if (e->data != nullptr) {
+    if (copy != nullptr) {
+        memcpy(copy, e, sizeof *copy);
+        copy->data = nullptr;
+        if (e->data == nullptr) return copy;
         copy->data = serialize_dup(e->data);
-        if (copy->data == nullptr) {
-            free(copy);
-            return nullptr;
-        }
+        if (copy->data != nullptr) return copy;
+        free(copy);
     }
-    return copy;
+    ZAL_LOGE("%s: out of memory\n", __func__);
+    return nullptr;
 }
 
 ZAL_API void zal_ipod_event_free(zal_ipod_event *e) {

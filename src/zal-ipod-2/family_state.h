@@ -6,7 +6,4 @@
 
 #include <cstdint>
 
-// Artwork of the current track (buffer, mapped file, geometry).
-struct zal_artwork_state {
-    void reset() {}
-};
+#include "zal-ipod-2/artwork_state.h"

@@ -11,6 +11,8 @@
 
 #include "zal-ipod-2/zal-ipod-2.h"
 #include "zal-ipod-2/browser_state.h"
+#include "zal-ipod-2/device_control_state.h"
+#include "zal-ipod-2/device_info_state.h"
 #include "zal-ipod-2/family_state.h"
 #include "zal-ipod-2/media_db_state.h"
 #include "zal-ipod-2/playback_state.h"
@@ -41,6 +43,10 @@ struct zal_pending_slots {
     uint16_t sample_rate_tid = 0;
     uint32_t preference_class = 0;
 };
+
+// Bits of zal_ipod_handle::connection_changes.
+constexpr unsigned kConnectionLost = 1u;
+constexpr unsigned kConnectionRestored = 2u;
 
 // Every 16-bit transaction id has an entry, so lookups need no range check.
 constexpr std::size_t kTransactionTableSize = 65536;
@@ -76,6 +82,18 @@ struct zal_ipod_handle {
     // send marks the socket broken and the next read reconnects.
     std::atomic<bool> peer_closed{false};
 
+    // Connection state reports (opt-in): the application's callback, and the changes the
+    // reader noticed that the dispatcher has not reported yet (kConnectionLost /
+    // kConnectionRestored bits). Reported by the dispatcher, never from inside the reader.
+    std::atomic<zal_ipod_connection_cb> connection_cb{nullptr};
+    std::atomic<void *> connection_cb_data{nullptr};
+    std::atomic<unsigned> connection_changes{0};
+    // True while the connection callback runs: a change noticed meanwhile waits until it
+    // returns instead of calling it again from within.
+    std::atomic<bool> reporting_connection{false};
+    // The state the application was last told (connected at first).
+    std::atomic<bool> reported_up{true};
+
     // Session and devices.
     std::atomic<uint32_t> ready{0};
     std::atomic<int32_t> current_session{0};
@@ -101,6 +119,8 @@ struct zal_ipod_handle {
     zal_artwork_state artwork;
     zal_records_state records;
     zal_browser_state browser;
+    zal_voiceover_state voiceover;
+    zal_device_info_state device_info;
 
     // Event thread.
     pthread_t loop_thread{};

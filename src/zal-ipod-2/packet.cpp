@@ -3,6 +3,7 @@
 
 #include <poll.h>
 #include <sys/socket.h>
+#include <sys/uio.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -63,10 +64,15 @@ int split_packets(zal_ipod_handle *h) {
     uint32_t pos = 0;
     zal_ipod_reply *first = nullptr;
     zal_ipod_reply *last = nullptr;
+    bool broken = false;
     while (h->rx_length - pos >= kPacketHeaderSize) {
         const unsigned char *p = h->rx_buffer + pos;
         uint32_t length = read_be32(p + 8);
-        if (length > kMaxPayloadLength) return -1;
+        if (length > kMaxPayloadLength) {
+            // The whole packets before it are still queued; the caller drops the stream.
+            broken = true;
+            break;
+        }
         if (length > h->rx_length - pos - kPacketHeaderSize) {
             // Reserve the whole packet now: the reads that complete it append in place.
             rx_reserve(h, length - (h->rx_length - pos - static_cast<uint32_t>(kPacketHeaderSize)));
@@ -90,6 +96,7 @@ int split_packets(zal_ipod_handle *h) {
         ++queued;
     }
     queue_append(h, first, last, queued);
+    if (broken) return -1;
     if (pos > 0) {
         h->rx_length -= pos;
         if (h->rx_length > 0) memmove(h->rx_buffer, h->rx_buffer + pos, h->rx_length);
@@ -157,10 +164,51 @@ int safesend(int fd, const void *bytes, std::size_t size) {
     return static_cast<int>(total);
 }
 
+namespace {
+// Header and payload in one call, so that the daemon wakes once per request instead of
+// twice (a separate write of the payload costs a whole extra scheduling round trip).
+int send_parts(int fd, const unsigned char *header, std::size_t header_size,
+               const unsigned char *payload, std::size_t payload_size) {
+    struct iovec parts[2] = {{const_cast<unsigned char *>(header), header_size},
+                             {const_cast<unsigned char *>(payload), payload_size}};
+    const std::size_t size = header_size + payload_size;
+    std::size_t total = 0;
+    while (total < size) {
+        struct msghdr message = {};
+        struct iovec rest[2];
+        int count = 0;
+        std::size_t offset = total;
+        for (const iovec &part : parts) {
+            if (offset >= part.iov_len) {
+                offset -= part.iov_len;
+                continue;
+            }
+            rest[count].iov_base = static_cast<unsigned char *>(part.iov_base) + offset;
+            rest[count].iov_len = part.iov_len - offset;
+            offset = 0;
+            ++count;
+        }
+        message.msg_iov = rest;
+        message.msg_iovlen = static_cast<decltype(message.msg_iovlen)>(count);
+        // No retry, not even for EAGAIN, as in safesend.
+        ssize_t n = sendmsg(fd, &message, MSG_NOSIGNAL);
+        if (n < 1) {
+            ZAL_LOGE("send error: %s\n", strerror(n == 0 ? EPIPE : errno));
+            return -1;
+        }
+        total += static_cast<std::size_t>(n);
+    }
+    return static_cast<int>(total);
+}
+}  // namespace
+
 void zal_connection_drop_locked(zal_ipod_handle *h) {
     pthread_mutex_lock(&h->send_lock);
     int fd = h->fd.exchange(-1);
-    if (fd >= 0) close(fd);
+    if (fd >= 0) {
+        close(fd);
+        h->connection_changes.fetch_or(kConnectionLost);
+    }
     h->send_failed = false;
     h->peer_closed = false;
     h->rx_length = 0;
@@ -203,11 +251,7 @@ extern "C" ZAL_API int zal_ipod_send_packet(zal_ipod_handle *h, zal_ipod_send_re
     int fd = h->fd.load();
     // A socket that failed a write is never written again: the reader closes it.
     if (fd >= 0 && !h->send_failed) {
-        sent = safesend(fd, header, sizeof header);
-        if (sent >= 0 && length > 0) {
-            int body = safesend(fd, encoded, length);
-            sent = body < 0 ? -1 : sent + body;
-        }
+        sent = send_parts(fd, header, sizeof header, encoded, length);
         if (sent < 0) {
             h->send_failed = true;
             shutdown(fd, SHUT_RDWR);  // wakes a reader that waits on it
@@ -264,10 +308,13 @@ int zal_ipod_receive(zal_ipod_handle *h) {
         error = errno;
     } else {
         error = ENOMEM;
+        ZAL_LOGE("%s: out of memory for the receive buffer\n", __func__);
     }
     if (n <= 0) {
-        bool broken =
-            h->send_failed.load() || error == ECONNRESET || error == ENOTCONN || error == EBADF;
+        // An orderly close keeps the socket until a send fails, unless the application
+        // asked to hear about lost connections: then the close is a loss at once.
+        bool broken = h->send_failed.load() || error == ECONNRESET || error == ENOTCONN ||
+                      error == EBADF || (n == 0 && h->connection_cb.load() != nullptr);
         if (n == 0 && !broken) h->peer_closed = true;
         if (broken) zal_connection_drop_locked(h);
         pthread_mutex_unlock(&h->read_lock);

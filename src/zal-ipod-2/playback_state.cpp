@@ -54,6 +54,13 @@ void zal_playback_cache_reset(zal_ipod_handle *h) {
     h->browser.reset();
 }
 
+zal_state_guard::zal_state_guard(zal_ipod_handle *h) : lock_(&h->state_lock) {
+    pthread_mutex_lock(lock_);
+}
+zal_state_guard::~zal_state_guard() {
+    pthread_mutex_unlock(lock_);
+}
+
 namespace {
 struct preference_pair {
     uint32_t preference_class;
@@ -64,12 +71,26 @@ constexpr preference_pair kPreferenceSettings[] = {
     {0, 0}, {0, 1}, {1, 0}, {1, 1},  {2, 0},  {2, 1},  {3, 0},  {3, 1},  {8, 1},  {8, 2},
     {8, 3}, {9, 0}, {9, 1}, {10, 0}, {10, 1}, {12, 0}, {12, 1}, {13, 0}, {13, 1},
 };
+constexpr std::size_t kSettings = sizeof kPreferenceSettings / sizeof kPreferenceSettings[0];
 }  // namespace
 
+uint32_t zal_preference_class(uint32_t preference_class) {
+    // The classes are the ones the settings table names.
+    for (const preference_pair &p : kPreferenceSettings)
+        if (p.preference_class == preference_class) return preference_class;
+    return 0;
+}
+
+int32_t zal_preference_value(int32_t setting) {
+    // Setting 0 is (class 0, value 0): 0 either way.
+    if (setting < 1 || static_cast<std::size_t>(setting) >= kSettings) return 0;
+    return kPreferenceSettings[setting].value;
+}
+
 int32_t zal_preference_setting(uint32_t preference_class, int32_t value) {
-    for (std::size_t i = 0; i < sizeof kPreferenceSettings / sizeof kPreferenceSettings[0]; ++i)
+    for (std::size_t i = 0; i < kSettings; ++i)
         if (kPreferenceSettings[i].preference_class == preference_class &&
             kPreferenceSettings[i].value == value)
             return static_cast<int32_t>(i);
-    return 255;
+    return kNoPreferenceSetting;
 }

@@ -2,9 +2,12 @@
 // by the dispatcher's events and read by the playback getters without traffic.
 #pragma once
 
+#include <pthread.h>
+
 #include <cstdint>
 
 struct zal_ipod_handle;
+struct zal_ipod_reply;
 
 struct zal_playback_state {
     char *title = nullptr;
@@ -52,5 +55,32 @@ void zal_playback_cache_reset(zal_ipod_handle *h);
 // Replaces *field by a copy of text (NULL clears it); the old text is released.
 void zal_replace_text(char **field, const char *text);
 
+// Preference numbers. A class the device does not know becomes class 0.
+uint32_t zal_preference_class(uint32_t preference_class);
 // Setting number of a (class, value) preference pair; 255 when the pair has none.
 int32_t zal_preference_setting(uint32_t preference_class, int32_t value);
+// Value of a setting number (1..18); 0 for any other number.
+int32_t zal_preference_value(int32_t setting);
+// Setting number meaning "no such setting".
+constexpr int32_t kNoPreferenceSetting = 255;
+
+// Holds the handle's state lock while a decoder writes the cache: a dispatcher on another
+// thread may apply an event or another reply to the same fields at the same time.
+class zal_state_guard {
+  public:
+    explicit zal_state_guard(zal_ipod_handle *h);
+    ~zal_state_guard();
+    zal_state_guard(const zal_state_guard &) = delete;
+    zal_state_guard &operator=(const zal_state_guard &) = delete;
+
+  private:
+    pthread_mutex_t *lock_;
+};
+
+// Decoders of the playback replies (the _sync forms and replies outside a wait).
+// Track information with the result key "current_track_info" / "indexed_track_info".
+int32_t zal_decode_current_track_info(zal_ipod_handle *h, const zal_ipod_reply *reply);
+int32_t zal_decode_indexed_track_info(zal_ipod_handle *h, const zal_ipod_reply *reply);
+int32_t zal_decode_play_state(zal_ipod_handle *h, const zal_ipod_reply *reply);
+int32_t zal_decode_chapter_status(zal_ipod_handle *h, const zal_ipod_reply *reply);
+int32_t zal_decode_sample_rate(zal_ipod_handle *h, const zal_ipod_reply *reply);

@@ -3,6 +3,7 @@
 #include "zal-ipod-2/reply_decoders.h"
 
 #include "zal-ipod-2/command.h"
+#include "zal-ipod-2/device_decoders.h"
 #include "zal-ipod-2/devices.h"
 #include "zal-ipod-2/media_db_state.h"
 #include "zal-ipod-2/playback_state.h"
@@ -35,23 +36,23 @@ int32_t adjust_preference(zal_ipod_handle *h, int32_t result) {
 using S = zal_pending_slots;
 
 constexpr zal_reply_decoder_row kDecoders[] = {
-    {&S::track_info_tid, nullptr, true},          // track info, key "current_track_info"
-    {&S::indexed_track_info_tid, nullptr, true},  // track info, key "indexed_track_info"
-    {&S::play_state_tid, nullptr, false},
+    {&S::track_info_tid, zal_decode_current_track_info, true},
+    {&S::indexed_track_info_tid, zal_decode_indexed_track_info, true},
+    {&S::play_state_tid, zal_decode_play_state, false},
     {&S::chapter_index_tid, decode_chapter_index, false},
-    {&S::chapter_status_tid, nullptr, false},
-    {&S::artwork_by_uid_tid, nullptr, true},
-    {&S::artwork_tid, nullptr, true},
-    {&S::sample_rate_tid, nullptr, true},
+    {&S::chapter_status_tid, zal_decode_chapter_status, false},
+    {&S::artwork_by_uid_tid, zal_artwork_decode, true},
+    {&S::artwork_tid, zal_artwork_decode, true},
+    {&S::sample_rate_tid, zal_decode_sample_rate, true},
     {&S::records_tid, zal_records_decode, false},
     {&S::session_tid, zal_session_decode_open, false},
     {&S::itunes_info_tid, zal_itunes_info_decode, false},
     {&S::db_track_info_tid, zal_db_track_info_decode, false},
     {&S::pb_track_info_tid, zal_pb_track_info_decode, false},
     {&S::uid_list_tid, decode_uid_list, false},
-    {&S::lingo_version_tid, nullptr, false},
-    {&S::localization_tid, nullptr, false},
-    {&S::voiceover_item_tid, nullptr, false},
+    {&S::lingo_version_tid, zal_lingo_version_decode, false},
+    {&S::localization_tid, zal_localization_decode, false},
+    {&S::voiceover_item_tid, zal_voiceover_item_decode, false},
 };
 
 constexpr zal_reply_adjuster_row kAdjusters[] = {

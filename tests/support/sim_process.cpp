@@ -84,7 +84,11 @@ bool SimProcess::spawn(const std::vector<std::string> &args) {
 }
 
 bool SimProcess::start_listening(const std::vector<std::string> &args) {
-    socket_name_ = unique_name("zal.sim.test");
+    return start_on(unique_name("zal.sim.test"), args);
+}
+
+bool SimProcess::start_on(const std::string &name, const std::vector<std::string> &args) {
+    socket_name_ = name;
     std::vector<std::string> all{"-u", socket_name_};
     all.insert(all.end(), args.begin(), args.end());
     if (!spawn(all)) return false;

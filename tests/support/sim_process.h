@@ -25,6 +25,9 @@ class SimProcess {
     void set_env(const std::string &key, const std::string &value) { env_[key] = value; }
     // Starts with "-u <unique name>" and args; true once it printed its ready line.
     bool start_listening(const std::vector<std::string> &args = {});
+    // The same on a name of the caller's choice (the daemon's own name, in a test process
+    // with a network namespace of its own).
+    bool start_on(const std::string &name, const std::vector<std::string> &args = {});
     // Starts with exactly args and waits for it to exit; returns the exit status
     // (-1 when it did not exit within timeout_ms; it is then killed).
     int run_to_exit(const std::vector<std::string> &args, int timeout_ms = 10000);

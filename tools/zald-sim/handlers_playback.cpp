@@ -24,11 +24,16 @@ void current_track_info(Call &c) {
     HashBuilder info;
     info.add("current_track_info", t != nullptr ? 1 : 0);
     if (t != nullptr) {
+        const int32_t chapter = d->current_chapter();
         info.add("title", t->title)
-            .add("chapter", std::string())
+            .add("chapter",
+                 chapter >= 0 ? t->chapters[static_cast<size_t>(chapter)].title : std::string())
             .add("artist", t->artist)
-            .add("album", t->album);
-        info.add("artwork", 0).add("has_chapters", 0).add("length", t->length_ms);
+            .add("album", t->album)
+            .add("artworkName", t->album);
+        info.add("artwork", 1)
+            .add("has_chapters", t->chapters.empty() ? 0 : 1)
+            .add("length", t->length_ms);
         info.add("position", d->player.position_ms).add("track_index", d->player.track);
     } else {
         info.add("length", 0);
@@ -51,8 +56,10 @@ void get_play_state(Call &c) {
 }
 
 void sample_rate(Call &c) {
-    if (c.require_session() == nullptr) return;
-    c.reply(HashBuilder().add("sample_rate", kSampleRate).take());
+    Device *d = c.require_session();
+    if (d == nullptr) return;
+    const Track *t = d->current_track();
+    c.reply(HashBuilder().add("sample_rate", t != nullptr ? t->sample_rate : kSampleRate).take());
 }
 
 void current_track_index(Call &c) {
@@ -103,15 +110,56 @@ void power_fact(Call &c) {
 constexpr char kCurrentDrawKey[] = "current_draw";
 constexpr char kChargeKey[] = "if_charge";
 
-// Tracks have no chapters in the simulation: index -1 and count 0; chapter requests fail.
+// Chapters of the current track: index -1 and count 0 for a track without any.
 void chapter_index(Call &c) {
-    if (c.require_session() != nullptr) c.reply_int(-1);
+    if (Device *d = c.require_session()) c.reply_int(d->current_chapter());
 }
 void chapter_count(Call &c) {
-    if (c.require_session() != nullptr) c.reply_int(0);
+    Device *d = c.require_session();
+    if (d == nullptr) return;
+    const Track *t = d->current_track();
+    c.reply_int(t != nullptr ? static_cast<int32_t>(t->chapters.size()) : 0);
 }
-void no_chapters(Call &c) {
-    if (c.require_session() != nullptr) c.fail("the current track has no chapters");
+
+// The chapter named by the integer argument, or null after answering ERROR.
+const Chapter *requested_chapter(Call &c, Device &d, int32_t *index) {
+    const Track *t = d.current_track();
+    if (t == nullptr || t->chapters.empty()) {
+        c.fail("the current track has no chapters");
+        return nullptr;
+    }
+    if (!value_as_int(c.arg, index)) {
+        c.fail("the request needs the chapter index as an integer");
+        return nullptr;
+    }
+    if (*index < 0 || *index >= static_cast<int32_t>(t->chapters.size())) {
+        c.fail("chapter " + std::to_string(*index) + " does not exist");
+        return nullptr;
+    }
+    return &t->chapters[static_cast<size_t>(*index)];
+}
+
+void set_chapter(Call &c) {
+    Device *d = c.require_session();
+    int32_t index = 0;
+    if (d == nullptr || requested_chapter(c, *d, &index) == nullptr) return;
+    c.world.set_chapter(*d, index);
+    c.reply_int(0);
+}
+
+// Length of the chapter and the position in it (0 for a chapter that is not playing).
+void chapter_play_status(Call &c) {
+    Device *d = c.require_session();
+    int32_t index = 0;
+    const Chapter *chapter = d != nullptr ? requested_chapter(c, *d, &index) : nullptr;
+    if (chapter == nullptr) return;
+    const int32_t position = d->current_chapter() == index
+                                 ? d->player.position_ms - chapter_start(*d->current_track(), index)
+                                 : 0;
+    c.reply(HashBuilder()
+                .add("chapter_length", chapter->length_ms)
+                .add("chapter_position", position)
+                .take());
 }
 
 void write_tag(Call &c) {
@@ -186,8 +234,8 @@ void register_playback_handlers(HandlerTable &table) {
     table[ZAL_OP_GET_IF_CHARGE] = power_fact<kChargeKey, 1>;
     table[ZAL_OP_GET_CURRENT_PLAYING_TRACK_CHAPTER_INDEX] = chapter_index;
     table[ZAL_OP_GET_CURRENT_PLAYING_TRACK_CHAPTER_COUNT] = chapter_count;
-    table[ZAL_OP_SET_CURRENT_PLAYING_TRACK_CHAPTER] = no_chapters;
-    table[ZAL_OP_GET_CURRENT_PLAYING_TRACK_CHAPTER_PLAY_STATUS] = no_chapters;
+    table[ZAL_OP_SET_CURRENT_PLAYING_TRACK_CHAPTER] = set_chapter;
+    table[ZAL_OP_GET_CURRENT_PLAYING_TRACK_CHAPTER_PLAY_STATUS] = chapter_play_status;
     table[ZAL_OP_WRITE_TAG] = write_tag;
     table[ZAL_OP_GET_COLOR_DISPLAY_IMAGE_LIMITS] = image_limits;
     table[ZAL_OP_SET_PREFERENCE] = set_preference;

@@ -157,6 +157,39 @@ Track read_track(const Source &src, const json &j, const std::string &place) {
     t.length_ms = static_cast<int32_t>(r.integer("length_ms", 180000, 1, INT32_MAX));
     t.audiobook = r.flag("audiobook", false);
     t.video = r.flag("video", false);
+    t.sample_rate = static_cast<int32_t>(r.integer("sample_rate", 44100, 8000, 192000));
+    t.uid = static_cast<uint64_t>(r.integer("uid", 0, 1, INT64_MAX));
+    if (r.has("album_color")) {
+        const std::string color = r.text("album_color", "");
+        if (color.size() != 7 || color[0] != '#' ||
+            color.find_first_not_of("0123456789abcdefABCDEF", 1) != std::string::npos)
+            src.fail(r.place("album_color"), "expected a colour \"#rrggbb\"");
+        t.album_color = static_cast<uint32_t>(std::stoul(color.substr(1), nullptr, 16));
+    }
+    if (const json *chapters = r.array("chapters")) {
+        int64_t total = 0;
+        for (size_t i = 0; i < chapters->size(); ++i) {
+            const std::string place = item_place(r.place("chapters"), i);
+            Reader c(src, (*chapters)[i], place);
+            Chapter chapter;
+            chapter.title = c.required_text("title");
+            chapter.length_ms = static_cast<int32_t>(c.integer("length_ms", 60000, 1, INT32_MAX));
+            c.finish();
+            total += chapter.length_ms;
+            if (total > t.length_ms) src.fail(place, "the chapters run past the track's length_ms");
+            t.chapters.push_back(chapter);
+        }
+    }
+    if (const json *times = r.array("artwork_times_ms")) {
+        for (size_t i = 0; i < times->size(); ++i) {
+            const json &v = (*times)[i];
+            const std::string place = item_place(r.place("artwork_times_ms"), i);
+            if (!v.is_number_integer() || v.get<int64_t>() < 0 || v.get<int64_t>() >= t.length_ms)
+                src.fail(place, "expected a time inside the track (0.." +
+                                    std::to_string(t.length_ms - 1) + ")");
+            t.artwork_times_ms.push_back(static_cast<int32_t>(v.get<int64_t>()));
+        }
+    }
     r.finish();
     return t;
 }
@@ -268,6 +301,18 @@ void read_library(const Source &src, const json *j, const std::string &place, De
     r->finish();
 }
 
+ArtworkSpec read_artwork(const Source &src, const json &j, const std::string &place) {
+    Reader r(src, j, place);
+    ArtworkSpec a;
+    static const std::vector<const char *> kDelivery = {"file", "inline"};
+    a.shared_file = r.choice("delivery", kDelivery, 0) == 0;
+    a.width = static_cast<int32_t>(r.integer("width", 240, 1, 1024));
+    a.height = static_cast<int32_t>(r.integer("height", 240, 1, 1024));
+    a.pixel_format = static_cast<int32_t>(r.integer("pixel_format", 2, 2, 3));
+    r.finish();
+    return a;
+}
+
 PlayerState read_playback(const Source &src, const json &j, const std::string &place,
                           const std::vector<Track> &tracks) {
     Reader r(src, j, place);
@@ -286,6 +331,38 @@ PlayerState read_playback(const Source &src, const json &j, const std::string &p
     if (p.state != kStopped && tracks.empty())
         src.fail(place + "/state", "a device without tracks cannot play");
     return p;
+}
+
+// A list of 1..max texts of 1..63 characters each.
+std::vector<std::string> read_texts(Reader &r, const char *key, std::vector<std::string> fallback,
+                                    size_t min_count, size_t max_count) {
+    const json *list = r.array(key);
+    if (list == nullptr) return fallback;
+    if (list->size() < min_count || list->size() > max_count)
+        r.source().fail(r.place(key), "expected " + std::to_string(min_count) + " to " +
+                                          std::to_string(max_count) + " texts");
+    std::vector<std::string> texts;
+    for (size_t i = 0; i < list->size(); ++i) {
+        const json &item = (*list)[i];
+        const std::string place = item_place(r.place(key), i);
+        if (!item.is_string())
+            r.source().fail(place, std::string("expected a string, found ") + kind_name(item));
+        texts.push_back(item.get<std::string>());
+        if (texts.back().empty() || texts.back().size() > 63)
+            r.source().fail(place, "a text needs 1 to 63 characters");
+    }
+    return texts;
+}
+
+void read_accessory(Reader &r, AccessorySpec &a) {
+    if (r.has("battery")) {
+        Reader battery(r.source(), r.raw("battery"), r.place("battery"));
+        a.battery_level = static_cast<int32_t>(battery.integer("level", 80, 0, 100));
+        a.battery_interval_ms = battery.integer("interval_ms", 10000, 10, 3600000);
+        battery.finish();
+    }
+    a.eq_profiles = read_texts(r, "eq_profiles", a.eq_profiles, 1, 64);
+    a.localization = read_texts(r, "localization", a.localization, 2, 2);
 }
 
 DeviceSpec read_device(const Source &src, const json &j, const std::string &place) {
@@ -315,6 +392,8 @@ DeviceSpec read_device(const Source &src, const json &j, const std::string &plac
     if (r.has("playback"))
         d.player = read_playback(src, r.raw("playback"), r.place("playback"), d.tracks);
     read_library(src, r.has("library") ? &r.raw("library") : nullptr, r.place("library"), d);
+    if (r.has("artwork")) d.artwork = read_artwork(src, r.raw("artwork"), r.place("artwork"));
+    read_accessory(r, d.accessory);
     r.finish();
     return d;
 }

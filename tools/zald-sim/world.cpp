@@ -32,6 +32,34 @@ const Track *Device::current_track() const {
     return &spec.tracks[static_cast<size_t>(player.track)];
 }
 
+const Track *Device::track_by_uid(uint64_t uid) const {
+    for (const Track &t : spec.tracks)
+        if (t.uid == uid) return &t;
+    return nullptr;
+}
+
+int32_t Device::current_chapter() const {
+    const Track *t = current_track();
+    return t != nullptr ? chapter_at(*t, player.position_ms) : -1;
+}
+
+int32_t chapter_start(const Track &track, int32_t chapter) {
+    int32_t start = 0;
+    for (int32_t i = 0; i < chapter && i < static_cast<int32_t>(track.chapters.size()); ++i)
+        start += track.chapters[static_cast<size_t>(i)].length_ms;
+    return start;
+}
+
+int32_t chapter_at(const Track &track, int32_t position_ms) {
+    if (track.chapters.empty()) return -1;
+    int32_t end = 0;
+    for (size_t i = 0; i < track.chapters.size(); ++i) {
+        end += track.chapters[i].length_ms;
+        if (position_ms < end) return static_cast<int32_t>(i);
+    }
+    return static_cast<int32_t>(track.chapters.size()) - 1;
+}
+
 World::World(std::vector<DeviceSpec> specs, WorldHost &host) : host_(host) {
     int32_t next_id = 1;
     for (auto &spec : specs) {
@@ -42,14 +70,22 @@ World::World(std::vector<DeviceSpec> specs, WorldHost &host) : host_(host) {
         device->extended = spec.extended;
         device->present = spec.present;
         device->preferences = default_preferences();
+        device->accessory.reset(spec.accessory);
         device->spec = std::move(spec);
+        // Identifiers nobody gave: the device number in the high half, the place below.
+        for (size_t i = 0; i < device->spec.tracks.size(); ++i) {
+            Track &t = device->spec.tracks[i];
+            if (t.uid == 0) t.uid = (uint64_t(uint32_t(device->id)) << 32) | (i + 1);
+        }
         devices_.push_back(std::move(device));
     }
 }
 
 void World::start() {
-    for (auto &device : devices_)
+    for (auto &device : devices_) {
         if (device->present && !device->authenticated) authenticate(*device);
+        run_battery(*device);
+    }
     // Scenario changes of the libraries, each pushed to a running update stream.
     for (auto &device : devices_) {
         for (const TimedLibraryChange &change : device->spec.library_changes) {
@@ -226,11 +262,40 @@ void World::set_state(Device &d, int32_t state) {
     emit_int(d, "play_state_changed", state);
 }
 
+// A new track: its index and position, its chapter, sample rate, flags and picture.
 void World::move_to_track(Device &d, int32_t index) {
     d.player.track = index;
     d.player.position_ms = 0;
     emit_int(d, "track_index_changed", index);
     emit_int(d, "track_position_changed", 0);
+    const Track *t = d.current_track();
+    if (t == nullptr) return;
+    announce_chapter(d);
+    emit_int(d, "samplerate_retrived", t->sample_rate);
+    if (t->audiobook) emit_int(d, "track_is_audiobook", 1);
+    if (t->video) emit_int(d, "track_contains_video", 1);
+    emit(d, "artwork_transfer_done", make_string(t->album));
+}
+
+void World::announce_chapter(Device &d) {
+    const Track *t = d.current_track();
+    if (t == nullptr) return;
+    emit(d, "chapter_index_changed",
+         HashBuilder()
+             .add("track_index", d.player.track)
+             .add("chapter_index", d.current_chapter())
+             .add("chapter_count", static_cast<int32_t>(t->chapters.size()))
+             .take());
+}
+
+bool World::set_chapter(Device &d, int32_t chapter) {
+    const Track *t = d.current_track();
+    if (t == nullptr || chapter < 0 || chapter >= static_cast<int32_t>(t->chapters.size()))
+        return false;
+    d.player.position_ms = chapter_start(*t, chapter);
+    emit_int(d, "track_position_changed", d.player.position_ms);
+    announce_chapter(d);
+    return true;
 }
 
 void World::play(Device &d) {
@@ -366,7 +431,9 @@ void World::tick(Millis elapsed) {
                 continue;
             }
         } else {
+            const int32_t chapter = d->current_chapter();
             p.position_ms = static_cast<int32_t>(position);
+            if (d->current_chapter() != chapter) announce_chapter(*d);
         }
         emit_int(*d, "track_position_changed", p.position_ms);
     }

@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "media_library.h"
+#include "accessory.h"
 #include "value_util.h"
 
 namespace sim {
@@ -29,6 +30,11 @@ enum PlayState : int32_t {
 // Link kinds; the number is the "transport" of a device entry.
 enum class Link : int32_t { kUsb = 0, kUsbRole = 1, kBluetooth = 2, kOther = 3 };
 
+struct Chapter {
+    std::string title;
+    int32_t length_ms = 60000;
+};
+
 struct Track {
     std::string title;
     std::string artist;
@@ -38,7 +44,19 @@ struct Track {
     int32_t length_ms = 180000;
     bool audiobook = false;
     bool video = false;
-    uint64_t uid = 0;  // persistent identifier in the device's media library (0: none)
+    int32_t sample_rate = 44100;
+    uint64_t uid = 0;               // persistent identifier; 0: derived from the track's place
+    uint32_t album_color = 0;       // 0xRRGGBB of the album's picture; 0: derived from the album
+    std::vector<Chapter> chapters;  // back to back from 0; empty: no chapters
+    std::vector<int32_t> artwork_times_ms;  // empty: the chapter starts, or 0
+};
+
+// How a device hands out its pictures.
+struct ArtworkSpec {
+    bool shared_file = true;  // false: pixels inline in the reply
+    int32_t width = 240;
+    int32_t height = 240;
+    int32_t pixel_format = 2;  // 2: RGB 5-6-5 little-endian, 3: big-endian
 };
 
 struct PlayerState {
@@ -72,6 +90,8 @@ struct DeviceSpec {
     // scenario gives none. The queue's tracks are part of it.
     MediaLibrary library;
     std::vector<TimedLibraryChange> library_changes;
+    ArtworkSpec artwork;
+    AccessorySpec accessory;
 };
 
 struct Device {
@@ -84,8 +104,18 @@ struct Device {
     PlayerState player;
     std::map<int32_t, int32_t> preferences;  // class -> value
     MediaSession media;
+    AccessoryState accessory;
     const Track *current_track() const;
+    // The track with this persistent identifier, or null.
+    const Track *track_by_uid(uint64_t uid) const;
+    // Chapter of the current track at the current position; -1 without chapters.
+    int32_t current_chapter() const;
 };
+
+// Start of a chapter in its track.
+int32_t chapter_start(const Track &track, int32_t chapter);
+// Chapter at a position; -1 for a track without chapters.
+int32_t chapter_at(const Track &track, int32_t position_ms);
 
 // What the world needs from the program around it.
 class WorldHost {
@@ -146,10 +176,21 @@ class World {
     bool set_repeat(Device &d, int32_t mode);
     // Replaces the play queue by library tracks and plays from start (index in the queue).
     void play_queue(Device &d, const std::vector<const LibraryTrack *> &queue, int32_t start);
+    // Moves to the start of a chapter of the current track.
+    bool set_chapter(Device &d, int32_t chapter);
 
     // Playback clock: advances every playing device by elapsed milliseconds and pushes
     // their positions.
     void tick(Millis elapsed);
+
+    // Runs action after delay on the program's clock (handlers schedule follow-up events).
+    void after(Millis delay, std::function<void()> action) {
+        host_.after(delay, std::move(action));
+    }
+    // Battery clock of a device (accessory.cpp), and its event.
+    void run_battery(Device &d);
+    void step_battery(Device &d);
+    void announce_battery(Device &d);
 
     void emit(const Device &d, const char *type, ValuePtr data);
     void emit_int(const Device &d, const char *type, int32_t value) {
@@ -159,6 +200,7 @@ class World {
   private:
     void set_state(Device &d, int32_t state);
     void move_to_track(Device &d, int32_t index);
+    void announce_chapter(Device &d);
 
     std::vector<std::unique_ptr<Device>> devices_;
     WorldHost &host_;
