@@ -266,6 +266,7 @@ void read_library(const Source &src, const json *j, const std::string &place, De
         lt.composer = t.composer;
         lt.length_ms = t.length_ms;
         lt.audiobook = t.audiobook;
+        lt.uid = t.uid;  // an identifier the scenario gives stays the track's
         t.uid = d.library.add_track(std::move(lt));
     }
     if (!r) return;
