@@ -3,6 +3,7 @@
 // it) on both protocols, the categories offered beneath every category, the records cache
 // of a short page, identifier lists, playing a selection, track information, and the depth
 // limit of the stack.
+#include <android/log.h>
 #include <gtest/gtest.h>
 
 #include <cstdio>
@@ -13,6 +14,7 @@
 
 #include "client_helpers.h"
 #include "fake_daemon.h"
+#include "log_capture.h"
 #include "zal-ipod-2/command.h"
 #include "zal-ipod-2/handle.h"
 
@@ -117,9 +119,10 @@ struct Step {
     Act act;
     std::vector<Exchange> wire;
     Outcome expected;
-    Names selection;         // the current filter after the step
-    int start_index = 0;     // zal_ipod_media_lib_get_current_selection_start_index after
-    const char *error = "";  // error text after the step ("" : none set yet / unchanged)
+    Names selection;               // the current filter after the step
+    int start_index = 0;           // zal_ipod_media_lib_get_current_selection_start_index after
+    const char *error = "";        // error text the step left ("": none)
+    const char *logged = nullptr;  // text of an error record the step must log
 };
 
 struct Walk {
@@ -397,9 +400,9 @@ const Walk kWalks[] = {
      1,
      {
          {"reset sends TOP and the hierarchy",
-          reset(1),
+          reset(2),
           {{ZAL_OP_SET_CATEGORY, [] { return serialize_int(0); }, [] { return serialize_int(11); }},
-           {ZAL_OP_SET_HIERARCHY, [] { return serialize_int(1); },
+           {ZAL_OP_SET_HIERARCHY, [] { return serialize_int(2); },
             [] { return serialize_int(1); }}},
           value(1),
           {}},
@@ -508,6 +511,25 @@ const Walk kWalks[] = {
           {},
           value(-1),
           {"ARTIST", "A2", "ALBUM", "B1", "TRACK"}},
+         {"an undo that fails on its first level keeps that level only",
+          undo(3),
+          {{ZAL_OP_SET_CATEGORY, [] { return serialize_int(2); },
+            [] {
+                return hash_of({{"error", serialize_string("busy")}});
+            },
+            true}},
+          value(0),
+          {"ARTIST"},
+          0,
+          "busy",
+          "Can not select category! (0)\n"},
+         {"undo to nothing resets with the stored hierarchy",
+          undo(0),
+          {{ZAL_OP_SET_CATEGORY, [] { return serialize_int(0); }, [] { return serialize_int(11); }},
+           {ZAL_OP_SET_HIERARCHY, [] { return serialize_int(2); },
+            [] { return serialize_int(1); }}},
+          value(1),
+          {}},
      }},
 };
 
@@ -529,7 +551,9 @@ TEST_P(BrowserWalk, EveryStepSendsAnswersAndLeavesTheStackAsTabled) {
                 d.reply(x.answer());
         }
         zal_set_error_message(h, nullptr);
+        LogCapture log;
         const Outcome got = step.act(h);
+        if (step.logged != nullptr) EXPECT_TRUE(log.contains(ANDROID_LOG_ERROR, step.logged));
         EXPECT_EQ(got.result, step.expected.result);
         EXPECT_EQ(got.names, step.expected.names);
         ASSERT_TRUE(d.finish(3000)) << d.report();
