@@ -29,6 +29,20 @@ const std::vector<SoakCommand> &soak_commands() {
         // Sessions.
         {"open_session", ZAL_OP_OPEN_SESSION,
          [](zal_ipod_handle *h) { zal_ipod_open_session_sync(h, 0); }},
+        // iAP1 database browsing (answered with an error on an iAP2 device) and the library.
+        {"set_category", ZAL_OP_SET_CATEGORY,
+         [](zal_ipod_handle *h) { zal_ipod_set_category_sync(h, 1); }},
+        {"get_records", ZAL_OP_GET_DB_RECORDS,
+         [](zal_ipod_handle *h) { zal_ipod_get_records_sync(h, 0, 8); }},
+        {"db_track_info", ZAL_OP_GET_DB_TRACK_INFO,
+         [](zal_ipod_handle *h) { zal_ipod_get_db_track_info_sync(h, 0, 8, 0); }},
+        {"media_library_uid", ZAL_OP_MEDIA_LIB_UID,
+         [](zal_ipod_handle *h) {
+             char mlid[MAXIMUM_MLID_LENGTH];
+             zal_ipod_get_media_library_unique_id_sync(h, mlid, sizeof mlid);
+         }},
+        {"genius_available", ZAL_OP_IS_GENIUS_AVAILABLEFORTRACK,
+         [](zal_ipod_handle *h) { zal_ipod_is_genius_availablefortrack_sync(h, 0, 0); }},
         // Runtime configuration.
         {"get_config", ZAL_OP_GET_CONFIG,
          [](zal_ipod_handle *h) { zal_ipod_get_config_sync(h, "socket_name", config_value); }},

@@ -58,6 +58,50 @@ const Command kCommands[] = {
     [](zal_ipod_handle *h) { use(zal_ipod_add_to_cart_sync(h)); },
     [](zal_ipod_handle *h) { use(zal_ipod_start_bt_connection_updates_sync(h)); },
     [](zal_ipod_handle *h) { use(zal_ipod_stop_bt_connection_updates_sync(h)); },
+    // iAP1 database browsing.
+    [](zal_ipod_handle *h) { use(zal_ipod_set_hierarchy_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_set_category_sync(h, 5)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_select_db_sync(h, 0, 5)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_records_sync(h, 0, 4)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_indexed_track_info_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_db_itunes_info_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_db_itunes_info_sync(h, 1)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_db_itunes_info_sync(h, 2)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_db_track_info_sync(h, 0, 4, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_get_pb_track_info_sync(h, 0, 4, 1)); },
+    // Library updates and play lists.
+    [](zal_ipod_handle *h) {
+        char mlid[MAXIMUM_MLID_LENGTH];
+        use(zal_ipod_get_media_library_unique_id_sync(h, mlid, sizeof mlid));
+    },
+    [](zal_ipod_handle *h) {
+        const uint8_t list[2] = {1, 2};
+        use(zal_ipod_set_update_items_sync(h, "aux", "lib", list, 2));
+    },
+    [](zal_ipod_handle *h) { use(zal_ipod_start_library_update_sync(h, "1")); },
+    [](zal_ipod_handle *h) { use(zal_ipod_stop_library_update_sync(h, "lib")); },
+    [](zal_ipod_handle *h) { use(zal_ipod_resume_library_update_sync(h, "lib", "1")); },
+    [](zal_ipod_handle *h) {
+        const uint64_t uids[2] = {1, 2};
+        use(zal_play_items_sync(h, uids, 2, 0));
+    },
+    [](zal_ipod_handle *h) { use(zal_play_collection_sync(h, 1, 2, 0, "lib")); },
+    [](zal_ipod_handle *h) {
+        const uint8_t uid[8] = {0, 0, 0, 0, 0, 0, 0, 1};
+        use(zal_ipod_prepare_uid_list_sync(h, 0, 0, 8, uid));
+    },
+    [](zal_ipod_handle *h) {
+        const uint8_t uid[8] = {0, 0, 0, 0, 0, 0, 0, 1};
+        use(zal_ipod_play_uid_list_sync(h, uid));
+    },
+    [](zal_ipod_handle *h) { use(zal_ipod_create_genius_playlist_sync(h, 0, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_refresh_genius_playlist_sync(h, 0)); },
+    [](zal_ipod_handle *h) { use(zal_ipod_is_genius_availablefortrack_sync(h, 0, 0)); },
+    [](zal_ipod_handle *h) {
+        uint8_t data = 0;
+        use(zal_ipod_get_playlist_info_sync(h, 0, 0, &data));
+        use(data);
+    },
     // Now playing.
     [](zal_ipod_handle *h) { use(zal_ipod_current_track_info_sync(h)); },
     [](zal_ipod_handle *h) { use(zal_ipod_current_track_sample_rate_sync(h)); },
@@ -142,6 +186,24 @@ const Command kCommands[] = {
         use(zal_ipod_send_accessory_wifi_configuration_information(h, "ap", "pw", 1, 2));
     },
 };
+
+// Every field of every track of a track info result, and one past the end.
+void read_track_info(const gval *r) {
+    const int count = zal_ipod_get_result_db_track_info_count(r);
+    for (int i = -1; i <= count; ++i) {
+        int number = 0;
+        const char *text = nullptr;
+        const uint8_t *uid = nullptr;
+        if (zal_ipod_get_result_db_track_info_capability(r, i, &number)) use(number);
+        if (zal_ipod_get_result_db_track_info_name(r, i, &text)) use_text(text);
+        if (zal_ipod_get_result_db_track_info_artist(r, i, &text)) use_text(text);
+        if (zal_ipod_get_result_db_track_info_album(r, i, &text)) use_text(text);
+        if (zal_ipod_get_result_db_track_info_genre(r, i, &text)) use_text(text);
+        if (zal_ipod_get_result_db_track_info_composer(r, i, &text)) use_text(text);
+        if (zal_ipod_get_result_db_track_info_duration(r, i, &number)) use(number);
+        if (zal_ipod_get_result_db_track_info_uid(r, i, &uid)) use(uid[7]);
+    }
+}
 
 }  // namespace
 
@@ -233,6 +295,14 @@ void zal_fuzz_read_handle(zal_ipod_handle *h) {
     use(zal_ipod_current_session(h));
     use(zal_ipod_is_session_opened(h));
     use(zal_ipod_is_ready(h));
+    use(zal_ipod_get_category(h));
+    const int records = zal_ipod_record_count(h);
+    for (int i = -1; i <= (records < 64 ? records : 64); ++i) use_text(zal_ipod_record(h, i));
+    read_track_info(zal_ipod_get_result_db_track_info(h));
+    read_track_info(zal_ipod_get_result_pb_track_info(h));
+    use(zal_ipod_get_result_db_device_uid(h)[7]);
+    use(zal_ipod_get_result_db_last_sync_time(h)[6]);
+    use(zal_ipod_get_result_db_itunes_info_count(h));
     use_text(zal_ipod_current_track_title(h));
     use_text(zal_ipod_current_track_chapter(h));
     use_text(zal_ipod_current_track_artist(h));

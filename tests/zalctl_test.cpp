@@ -164,11 +164,14 @@ TEST_F(ZalctlTest, TransportStepsChangeTheSharedPlayer) {
         int track_index;
         const char *title;
     };
+    // Skipping happens while paused at the start of a track, so "prev" always goes back a
+    // track (after 3 s of play it would restart the track instead).
     const Step steps[] = {
-        {"next", "paused", 1, "Loopback"},    {"play", "playing", 1, "Loopback"},
-        {"pause", "paused", 1, "Loopback"},   {"prev", "paused", 0, "Morning Drive"},
-        {"prev", "paused", 3, nullptr},       {"next", "paused", 0, "Morning Drive"},
-        {"playpause", "playing", 0, nullptr}, {"stop", "stopped", 0, nullptr},
+        {"next", "paused", 1, "Loopback"},       {"prev", "paused", 0, "Morning Drive"},
+        {"prev", "paused", 3, nullptr},  // wraps to the last track
+        {"next", "paused", 0, "Morning Drive"},  {"play", "playing", 0, "Morning Drive"},
+        {"pause", "paused", 0, "Morning Drive"}, {"playpause", "playing", 0, nullptr},
+        {"stop", "stopped", 0, nullptr},
     };
     for (const Step &s : steps) {
         const ProgramResult r = zalctl({"--json", s.command});
@@ -231,6 +234,8 @@ TEST(ZalctlUsage, WrongCommandLinesExitWithTwo) {
         EXPECT_FALSE(r.err.empty()) << joined(args);
         EXPECT_EQ(r.out, "") << joined(args);
     }
+    EXPECT_EQ(zalctl({"--json", "bogus"}).err,
+              "zalctl: unknown command: bogus (see zalctl --help)\n");
 }
 
 TEST(ZalctlUsage, EverySubcommandHasHelp) {

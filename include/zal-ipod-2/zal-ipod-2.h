@@ -472,8 +472,7 @@ ZAL_API int zal_ipod_set_current_playing_track_chapter(zal_ipod_handle *h, int c
 ZAL_API int zal_ipod_set_current_playing_track_chapter_sync(zal_ipod_handle *h, int chapter);
 /* GET_CURRENT_PLAYING_TRACK_CHAPTER_PLAY_STATUS for a chapter. _sync: 0, with the chapter
  * length and position cached (-1 when absent). */
-ZAL_API int zal_ipod_get_current_playing_track_chapter_play_status(zal_ipod_handle *h,
-                                                                   int chapter);
+ZAL_API int zal_ipod_get_current_playing_track_chapter_play_status(zal_ipod_handle *h, int chapter);
 /* Synchronous form of zal_ipod_get_current_playing_track_chapter_play_status. */
 ZAL_API int zal_ipod_get_current_playing_track_chapter_play_status_sync(zal_ipod_handle *h,
                                                                         int chapter);
@@ -514,8 +513,7 @@ ZAL_API int zal_ipod_get_ipod_preference(zal_ipod_handle *h, uint32_t preference
 /* Synchronous form: the raw value; 255 without a reply or for one that is no integer. */
 ZAL_API int zal_ipod_get_ipod_preference_sync(zal_ipod_handle *h, uint32_t preference_class);
 /* SET_PREFERENCE with (class, value) as given. */
-ZAL_API int zal_ipod_set_ipod_preference(zal_ipod_handle *h, uint32_t preference_class,
-                                         int value);
+ZAL_API int zal_ipod_set_ipod_preference(zal_ipod_handle *h, uint32_t preference_class, int value);
 /* Synchronous form of zal_ipod_set_ipod_preference; the daemon's integer. */
 ZAL_API int zal_ipod_set_ipod_preference_sync(zal_ipod_handle *h, uint32_t preference_class,
                                               int value);
@@ -970,7 +968,8 @@ ZAL_API int zal_ipod_get_records(zal_ipod_handle *h, int offset, int count);
 ZAL_API int zal_ipod_get_records_sync(zal_ipod_handle *h, int offset, int count);
 /* INDEXED_TRACK_INFO for track index of the play queue. */
 ZAL_API int zal_ipod_indexed_track_info(zal_ipod_handle *h, int index);
-/* As zal_ipod_indexed_track_info: the integer "indexed_track_info" of the reply, -1 on failure. */
+/* As zal_ipod_indexed_track_info: the track's information goes to the current-track cache as
+ * for zal_ipod_current_track_info_sync; returns the reply's "indexed_track_info", -1 on failure. */
 ZAL_API int zal_ipod_indexed_track_info_sync(zal_ipod_handle *h, int index);
 /* GET_DB_ITUNES_INFO for an information type (0 library identifier, 1 last sync time,
  * others a count). */
@@ -1255,8 +1254,8 @@ ZAL_API int zal_ipod_media_lib_get_track_genre(zal_ipod_handle *h, const void *r
 
 /** Connection state as the connection callback reports it. */
 typedef enum zal_ipod_connection_state {
-    ZALIPOD_CONNECTION_LOST = 0,     /**< the daemon went away; the library will reconnect */
-    ZALIPOD_CONNECTION_RESTORED = 1  /**< connected again, device list fetched anew */
+    ZALIPOD_CONNECTION_LOST = 0,    /**< the daemon went away; the library will reconnect */
+    ZALIPOD_CONNECTION_RESTORED = 1 /**< connected again, device list fetched anew */
 } zal_ipod_connection_state;
 
 /** Connection callback; state is a zal_ipod_connection_state. */
@@ -1279,8 +1278,7 @@ typedef void (*zal_ipod_connection_cb)(zal_ipod_handle *h, int state, void *user
  * included. A change noticed while it runs is reported after it returns. NULL removes the
  * callback and restores the default treatment of an orderly close. Any thread may set
  * it. */
-ZAL_API void zal_ipod_set_connection_cb(zal_ipod_handle *h, zal_ipod_connection_cb cb,
-                                        void *user);
+ZAL_API void zal_ipod_set_connection_cb(zal_ipod_handle *h, zal_ipod_connection_cb cb, void *user);
 
 ZAL_END_DECLS
 

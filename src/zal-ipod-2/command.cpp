@@ -192,6 +192,10 @@ const char *zal_hash_string(const gval *hash, const char *key) {
     return zal_kind(v) == SERIALIZE_STRING ? serialize_get_string(v) : nullptr;
 }
 
+bool zal_reply_error(zal_ipod_handle *h, const gval *hash) {
+    return zal_kind(hash) == SERIALIZE_HASH && take_error(h, hash);
+}
+
 bool zal_flag_set(const gval *hash, const char *key) {
     return zal_hash_int(hash, key, 0) != 0;
 }

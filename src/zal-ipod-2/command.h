@@ -115,6 +115,15 @@ int32_t zal_cmd_sync(zal_ipod_handle *h, int tid, zal_record_decoder decode);
 // reply or no payload came; for replies whose value outlives the wait.
 gval *zal_cmd_sync_value(zal_ipod_handle *h, int tid);
 
+// Reads an integer under key of a hash; fallback when absent or not an integer.
+int32_t zal_hash_int(const gval *hash, const char *key, int32_t fallback);
+// String under key, or nullptr.
+const char *zal_hash_string(const gval *hash, const char *key);
+
+// For decoders that take other shapes than a hash too: stores the "error" text of a reply
+// hash as the handle's error text; true when there was one.
+bool zal_reply_error(zal_ipod_handle *h, const gval *hash);
+
 // Hash rule with a reader that may carry context (a lambda writing the caller's outputs).
 template <typename Read>
 int32_t zal_decode_hash_with(zal_ipod_handle *h, const zal_ipod_reply *reply, Read &&read) {

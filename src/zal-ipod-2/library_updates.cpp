@@ -129,18 +129,13 @@ int32_t read_collection_played(zal_ipod_handle *, const gval *hash) {
     return zal_hash_int(hash, "collection_played", -1);
 }
 
-gval *reply_value(const zal_ipod_reply *reply) {
-    if (reply == nullptr || reply->length == 0 || reply->payload == nullptr) return nullptr;
-    return unserialize(reply->payload, reply->length);
-}
-
 // Genius availability: 0 unless the reply says it is available; then its non-zero
 // "result", or 1. An error hash keeps its text and reads as not available.
 int32_t decode_genius_available(zal_ipod_handle *h, const zal_ipod_reply *reply) {
-    gval *v = reply_value(reply);
+    gval *v = zal_reply_value(reply);
     int32_t result = 0;
     if (zal_kind(v) == SERIALIZE_HASH) {
-        if (const char *error = zal_hash_string(v, "error")) zal_set_error_message(h, error);
+        zal_reply_error(h, v);
         if (zal_hash_int(v, "is_genius_availablefortrack", 0) != 0) {
             const int32_t r = zal_hash_int(v, "result", 0);
             result = r != 0 ? r : 1;
@@ -153,10 +148,10 @@ int32_t decode_genius_available(zal_ipod_handle *h, const zal_ipod_reply *reply)
 // Play list information, read for the caller's data byte: the decoder pattern takes no
 // extra argument, so the _sync form decodes here itself.
 int32_t decode_playlist_info(zal_ipod_handle *h, const zal_ipod_reply *reply, uint8_t *data) {
-    gval *v = reply_value(reply);
+    gval *v = zal_reply_value(reply);
     int32_t result = -1;
     if (zal_kind(v) == SERIALIZE_HASH) {
-        if (const char *error = zal_hash_string(v, "error")) zal_set_error_message(h, error);
+        zal_reply_error(h, v);
         if (zal_hash_int(v, "playlist_info", 0) != 0) {
             result = zal_hash_int(v, "status", -1);
             (void)zal_hash_int(v, "type", 0);  // the device's; not used here
@@ -180,7 +175,7 @@ ZAL_API int zal_ipod_get_media_library_unique_id_sync(zal_ipod_handle *h, char *
     if (h == nullptr) return 0;
     zal_ipod_reply *reply =
         zal_ipod_wait_for_tid_ex(h, static_cast<uint16_t>(zal_ipod_get_media_library_unique_id(h)));
-    gval *v = reply_value(reply);
+    gval *v = zal_reply_value(reply);
     int result = 0;
     if (zal_kind(v) == SERIALIZE_STRING) {
         result = 1;

@@ -8,6 +8,7 @@
 #include "zal-ipod-2/command.h"
 #include "zal-ipod-2/media_db_state.h"
 #include "zal-ipod-2/packet.h"
+#include "zal-ipod-2/playback_state.h"
 
 zal_records_state::~zal_records_state() {
     serialize_free(records);
@@ -16,20 +17,6 @@ zal_records_state::~zal_records_state() {
 }
 
 namespace {
-
-gval *reply_value(const zal_ipod_reply *reply) {
-    if (reply == nullptr || reply->length == 0 || reply->payload == nullptr) return nullptr;
-    return unserialize(reply->payload, reply->length);
-}
-
-// Stores the "error" text of a hash; true when there was one.
-bool take_error(zal_ipod_handle *h, const gval *hash) {
-    const gval *error = serialize_hash_get(hash, "error");
-    if (error == nullptr) return false;
-    zal_set_error_message(h,
-                          zal_kind(error) == SERIALIZE_STRING ? serialize_get_string(error) : "");
-    return true;
-}
 
 int32_t array_int(const gval *array, uint32_t i, int32_t fallback) {
     const gval *v = serialize_array_get(array, i);
@@ -42,10 +29,10 @@ int32_t array_int(const gval *array, uint32_t i, int32_t fallback) {
 // -1, and the previous result stays.
 int32_t decode_track_info(zal_ipod_handle *h, const zal_ipod_reply *reply, gval **result) {
     if (h == nullptr) return -1;
-    gval *v = reply_value(reply);
+    gval *v = zal_reply_value(reply);
     if (v == nullptr) return -1;
     if (zal_kind(v) != SERIALIZE_ARRAY) {
-        if (zal_kind(v) == SERIALIZE_HASH) take_error(h, v);
+        if (zal_kind(v) == SERIALIZE_HASH) zal_reply_error(h, v);
         serialize_free(v);
         return -1;
     }
@@ -95,10 +82,6 @@ int32_t keep_record_count(zal_ipod_handle *h, int32_t result) {
     return result;
 }
 
-int32_t decode_indexed_track_info(zal_ipod_handle *, const gval *hash) {
-    return zal_hash_int(hash, "indexed_track_info", -1);
-}
-
 // Track info layouts: identifiers only when the result is empty or starts with a byte
 // string, else full records of kFieldsPerTrack elements.
 constexpr uint32_t kFieldsPerTrack = 8;
@@ -113,24 +96,25 @@ enum TrackField : uint32_t {
     kUid = 7,
 };
 
-bool identifier_layout(const gval *result) {
-    return serialize_array_count(result) == 0 ||
-           zal_kind(serialize_array_get(result, 0)) == SERIALIZE_BYTES;
+// The result's array body, read directly: the accessors run for every field of thousands
+// of tracks, so they index the body once instead of going through the checked getters.
+const gval_array *items_of(const gval *result) {
+    return zal_kind(result) == SERIALIZE_ARRAY ? static_cast<const gval_array *>(result->data)
+                                               : nullptr;
 }
 
-uint32_t element_count(const gval *result) {
-    return zal_kind(result) == SERIALIZE_ARRAY
-               ? static_cast<uint32_t>(serialize_array_count(result))
-               : 0;
+bool identifier_layout(const gval_array *a) {
+    return a->count <= 0 || zal_kind(a->items[0]) == SERIALIZE_BYTES;
 }
 
 // Element of field f of track i in a full-layout result, or nullptr when track i is not
 // whole in it. The arithmetic is 64-bit so that no index wraps.
 const gval *full_field(const gval *result, int i, uint32_t f) {
-    if (i < 0 || zal_kind(result) != SERIALIZE_ARRAY || identifier_layout(result)) return nullptr;
-    const uint64_t tracks = element_count(result) / kFieldsPerTrack;
-    if (static_cast<uint64_t>(i) >= tracks) return nullptr;
-    return serialize_array_get(result, static_cast<uint32_t>(i) * kFieldsPerTrack + f);
+    const gval_array *a = items_of(result);
+    if (i < 0 || a == nullptr || identifier_layout(a)) return nullptr;
+    if (static_cast<uint64_t>(i) >= static_cast<uint64_t>(a->count) / kFieldsPerTrack)
+        return nullptr;
+    return a->items[static_cast<uint64_t>(i) * kFieldsPerTrack + f];
 }
 
 int int_field(const gval *result, int i, uint32_t f, int *out) {
@@ -152,7 +136,7 @@ int text_field(const gval *result, int i, uint32_t f, const char **out) {
 int32_t zal_records_decode(zal_ipod_handle *h, const zal_ipod_reply *reply) {
     if (h == nullptr || reply == nullptr || reply->length == 0 || reply->payload == nullptr)
         return -1;
-    gval *v = reply_value(reply);
+    gval *v = zal_reply_value(reply);
     if (zal_kind(v) != SERIALIZE_ARRAY) {
         serialize_free(v);
         return 1;
@@ -221,7 +205,7 @@ ZAL_API int zal_ipod_indexed_track_info(zal_ipod_handle *h, int index) {
                         &zal_pending_slots::indexed_track_info_tid);
 }
 ZAL_API int zal_ipod_indexed_track_info_sync(zal_ipod_handle *h, int index) {
-    return zal_cmd_sync_hash(h, zal_ipod_indexed_track_info(h, index), decode_indexed_track_info);
+    return zal_cmd_sync(h, zal_ipod_indexed_track_info(h, index), zal_decode_indexed_track_info);
 }
 
 ZAL_API int zal_ipod_get_db_itunes_info(zal_ipod_handle *h, int type) {
@@ -304,9 +288,9 @@ ZAL_API int zal_ipod_get_result_db_itunes_info_count(zal_ipod_handle *h) {
 }
 
 ZAL_API int zal_ipod_get_result_db_track_info_count(const gval *result) {
-    if (zal_kind(result) != SERIALIZE_ARRAY) return 0;
-    const uint32_t n = element_count(result);
-    return static_cast<int>(identifier_layout(result) ? n : n / kFieldsPerTrack);
+    const gval_array *a = items_of(result);
+    if (a == nullptr || a->count <= 0) return 0;
+    return identifier_layout(a) ? a->count : a->count / static_cast<int32_t>(kFieldsPerTrack);
 }
 
 ZAL_API int zal_ipod_get_result_db_track_info_capability(const gval *result, int i, int *out) {
@@ -334,9 +318,11 @@ ZAL_API int zal_ipod_get_result_db_track_info_duration(const gval *result, int i
 
 ZAL_API int zal_ipod_get_result_db_track_info_uid(const gval *result, int i, const uint8_t **out) {
     if (i < 0 || zal_kind(result) != SERIALIZE_ARRAY || out == nullptr) return 0;
-    const gval *v = identifier_layout(result)
-                        ? serialize_array_get(result, static_cast<uint32_t>(i))
-                        : full_field(result, i, kUid);
+    const gval_array *a = items_of(result);
+    if (a == nullptr) return 0;
+    const gval *v = !identifier_layout(a) ? full_field(result, i, kUid)
+                    : i < a->count        ? a->items[i]
+                                          : nullptr;
     if (zal_kind(v) != SERIALIZE_BYTES) return 0;
     uint32_t length = 0;
     *out = static_cast<const uint8_t *>(serialize_get_bytes(v, &length));

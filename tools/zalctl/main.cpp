@@ -41,6 +41,9 @@ int main(int argc, char **argv) {
     add_transport_commands(app, session);
     add_config_commands(app, session);
     add_event_commands(app, session);
+    add_playback_commands(app, session);
+    add_device_info_commands(app, session);
+    add_media_commands(app, session);
     add_browse_commands(app, session);
 
     try {
@@ -50,6 +53,12 @@ int main(int argc, char **argv) {
     } catch (const CLI::CallForAllHelp &e) {
         return app.exit(e);
     } catch (const CLI::ParseError &e) {
+        // "zalctl bogus" would otherwise only hear that a command is required.
+        const std::vector<std::string> left = app.remaining();
+        if (app.get_subcommands().empty() && !left.empty()) {
+            fprintf(stderr, "zalctl: unknown command: %s (see zalctl --help)\n", left[0].c_str());
+            return kExitUsage;
+        }
         app.exit(e);
         return kExitUsage;
     }

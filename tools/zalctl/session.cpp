@@ -138,11 +138,11 @@ void Session::fail_without_reply(const char *what, Clock::time_point started) {
 
 int Session::dispatch_event(zal_ipod_handle *, zal_ipod_event *event, void *user) {
     auto *self = static_cast<Session *>(user);
-    // An exception must not cross the library's C frames; a failing handler ends here.
+    // An exception must not cross the library's C frames: a handler that fails (output
+    // it cannot write, say) loses that one event.
     try {
         if (self->event_handler_ && event != nullptr) self->event_handler_(*event);
     } catch (...) {
-        self->handler_failed_ = true;
     }
     return 0;
 }

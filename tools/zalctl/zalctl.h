@@ -79,7 +79,6 @@ class Session {
     zal_ipod_handle *h_ = nullptr;
     EventHandler event_handler_;
     const char *last_error_ = nullptr;  // error text pointer before the current command
-    bool handler_failed_ = false;       // an event handler threw (the event was skipped)
 };
 
 // Registers what a subcommand does once the whole command line parsed without error.
@@ -105,12 +104,21 @@ void add_status_commands(CLI::App &app, Session &s);     // status
 void add_transport_commands(CLI::App &app, Session &s);  // play, pause, ..., next, prev
 void add_config_commands(CLI::App &app, Session &s);     // config get / set
 void add_event_commands(CLI::App &app, Session &s);      // events
+// shuffle, repeat, seek, track, prefs get / set, artwork
+void add_playback_commands(CLI::App &app, Session &s);
+// info, eq, button, voiceover, call-state, eap (commands_device.cpp)
+void add_device_info_commands(CLI::App &app, Session &s);
+void add_media_commands(CLI::App &app, Session &s);      // db, library, playlist, play-items
 void add_browse_commands(CLI::App &app, Session &s);     // browse
 
-// Shared by status and transport: the current track through CURRENT_TRACK_INFO, as JSON
-// (title, artist, album, state, track_index, number_of_tracks, position_ms, length_ms).
+// Shared by status, transport and playback: the current track, as JSON (has_track, title,
+// artist, album, chapter, state, track_index, number_of_tracks, position_ms, length_ms,
+// shuffle, repeat).
 Json now_playing(Session &s);
 // One line for people: "paused  Title - Artist  [###...] 0:42 / 3:35  (1/4)".
 std::string now_playing_line(const Json &np);
+// The block status shows: one "label: value" line each for title, artist, album, chapter,
+// position (bar, time / length, track of tracks), state, shuffle and repeat.
+std::string now_playing_block(const Json &np);
 
 }  // namespace zalctl

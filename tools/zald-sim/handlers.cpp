@@ -20,11 +20,11 @@ HandlerTable make_handler_table() {
     register_core_handlers(table);
     register_transport_handlers(table);
     register_playback_handlers(table);
-    register_media_handlers(table);
-    register_browse_handlers(table);
     register_artwork_handlers(table);
     register_device_handlers(table);
     register_comms_handlers(table);
+    register_media_handlers(table);
+    register_browse_handlers(table);
     return table;
 }
 

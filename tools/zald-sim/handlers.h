@@ -55,10 +55,10 @@ HandlerTable make_handler_table();
 void register_core_handlers(HandlerTable &table);
 void register_transport_handlers(HandlerTable &table);
 void register_playback_handlers(HandlerTable &table);
-void register_media_handlers(HandlerTable &table);
-void register_browse_handlers(HandlerTable &table);
 void register_artwork_handlers(HandlerTable &table);
 void register_device_handlers(HandlerTable &table);
 void register_comms_handlers(HandlerTable &table);
+void register_media_handlers(HandlerTable &table);
+void register_browse_handlers(HandlerTable &table);
 
 }  // namespace sim

@@ -13,7 +13,6 @@ constexpr int32_t kSampleRate = 44100;
 constexpr int32_t kCurrentDrawMa = 500;
 // What the head unit's display may receive as artwork.
 constexpr int32_t kMaxImageSide = 320;
-constexpr int32_t kPixelFormatRgb565 = 2;
 
 void current_track_info(Call &c) {
     Device *d = c.require_session();
@@ -166,12 +165,14 @@ void write_tag(Call &c) {
     if (c.require_session() != nullptr) c.reply_int(0);
 }
 
+// The pixel format is the one the device's pictures come in.
 void image_limits(Call &c) {
-    if (c.require_session() == nullptr) return;
+    Device *d = c.require_session();
+    if (d == nullptr) return;
     c.reply(HashBuilder()
                 .add("maxImageWidth", kMaxImageSide)
                 .add("maxImageHeigh", kMaxImageSide)  // the key is spelt so on the wire
-                .add("pixelFormat", kPixelFormatRgb565)
+                .add("pixelFormat", d->spec.artwork.pixel_format)
                 .take());
 }
 

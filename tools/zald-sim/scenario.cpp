@@ -241,8 +241,8 @@ uint32_t serial_seed(const std::string &serial) {
 
 constexpr int32_t kDefaultLibraryTracks = 300;
 
-// The library, the queue's tracks (which it must hold, so that they have identifiers) and
-// its timed changes.
+// The library and its timed changes (the play queue's tracks join it in the world, with
+// their identifiers).
 void read_library(const Source &src, const json *j, const std::string &place, DeviceSpec &d) {
     std::optional<Reader> r;
     if (j != nullptr) r.emplace(src, *j, place);
@@ -257,18 +257,6 @@ void read_library(const Source &src, const json *j, const std::string &place, De
     d.library.mlid =
         r ? r->text("mlid", "SIMLIB-" + d.serial, MAXIMUM_MLID_LENGTH - 1) : "SIMLIB-" + d.serial;
     if (r) d.library.genius_available = r->flag("genius", true);
-    for (Track &t : d.tracks) {
-        LibraryTrack lt;
-        lt.title = t.title;
-        lt.artist = t.artist;
-        lt.album = t.album;
-        lt.genre = t.genre;
-        lt.composer = t.composer;
-        lt.length_ms = t.length_ms;
-        lt.audiobook = t.audiobook;
-        lt.uid = t.uid;  // an identifier the scenario gives stays the track's
-        t.uid = d.library.add_track(std::move(lt));
-    }
     if (!r) return;
     for (LibraryTrack &t : read_library_tracks(src, *r, "tracks"))
         d.library.add_track(std::move(t));
@@ -392,9 +380,9 @@ DeviceSpec read_device(const Source &src, const json &j, const std::string &plac
     }
     if (r.has("playback"))
         d.player = read_playback(src, r.raw("playback"), r.place("playback"), d.tracks);
-    read_library(src, r.has("library") ? &r.raw("library") : nullptr, r.place("library"), d);
     if (r.has("artwork")) d.artwork = read_artwork(src, r.raw("artwork"), r.place("artwork"));
     read_accessory(r, d.accessory);
+    read_library(src, r.has("library") ? &r.raw("library") : nullptr, r.place("library"), d);
     r.finish();
     return d;
 }

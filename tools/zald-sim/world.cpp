@@ -60,6 +60,26 @@ int32_t chapter_at(const Track &track, int32_t position_ms) {
     return static_cast<int32_t>(track.chapters.size()) - 1;
 }
 
+namespace {
+
+// The play queue's tracks belong to the library too, under the same identifiers.
+void add_queue_to_library(DeviceSpec &spec) {
+    for (Track &t : spec.tracks) {
+        LibraryTrack lt;
+        lt.uid = t.uid;
+        lt.title = t.title;
+        lt.artist = t.artist;
+        lt.album = t.album;
+        lt.genre = t.genre;
+        lt.composer = t.composer;
+        lt.length_ms = t.length_ms;
+        lt.audiobook = t.audiobook;
+        t.uid = spec.library.add_track(std::move(lt));
+    }
+}
+
+}  // namespace
+
 World::World(std::vector<DeviceSpec> specs, WorldHost &host) : host_(host) {
     int32_t next_id = 1;
     for (auto &spec : specs) {
@@ -77,6 +97,7 @@ World::World(std::vector<DeviceSpec> specs, WorldHost &host) : host_(host) {
             Track &t = device->spec.tracks[i];
             if (t.uid == 0) t.uid = (uint64_t(uint32_t(device->id)) << 32) | (i + 1);
         }
+        add_queue_to_library(device->spec);
         devices_.push_back(std::move(device));
     }
 }
@@ -388,6 +409,11 @@ void World::play_queue(Device &d, const std::vector<const LibraryTrack *> &queue
     std::vector<Track> tracks;
     tracks.reserve(queue.size());
     for (const LibraryTrack *t : queue) {
+        // A track already queued keeps what the scenario gave it (chapters, artwork, ...).
+        if (const Track *queued = d.track_by_uid(t->uid)) {
+            tracks.push_back(*queued);
+            continue;
+        }
         Track track;
         track.title = t->title;
         track.artist = t->artist;

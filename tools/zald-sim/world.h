@@ -10,8 +10,8 @@
 #include <string>
 #include <vector>
 
-#include "media_library.h"
 #include "accessory.h"
+#include "media_library.h"
 #include "value_util.h"
 
 namespace sim {
@@ -86,12 +86,12 @@ struct DeviceSpec {
     std::string playing_app = "Music";
     std::vector<Track> tracks;  // the play queue
     PlayerState player;
+    ArtworkSpec artwork;
+    AccessorySpec accessory;
     // The media library (its changes over time included); a generated one when the
     // scenario gives none. The queue's tracks are part of it.
     MediaLibrary library;
     std::vector<TimedLibraryChange> library_changes;
-    ArtworkSpec artwork;
-    AccessorySpec accessory;
 };
 
 struct Device {
@@ -103,8 +103,8 @@ struct Device {
     int32_t sessions = 0;  // clients with a session open on it ("used")
     PlayerState player;
     std::map<int32_t, int32_t> preferences;  // class -> value
-    MediaSession media;
     AccessoryState accessory;
+    MediaSession media;
     const Track *current_track() const;
     // The track with this persistent identifier, or null.
     const Track *track_by_uid(uint64_t uid) const;
@@ -174,10 +174,10 @@ class World {
     bool set_track(Device &d, int32_t index);
     bool set_shuffle(Device &d, int32_t mode);
     bool set_repeat(Device &d, int32_t mode);
-    // Replaces the play queue by library tracks and plays from start (index in the queue).
-    void play_queue(Device &d, const std::vector<const LibraryTrack *> &queue, int32_t start);
     // Moves to the start of a chapter of the current track.
     bool set_chapter(Device &d, int32_t chapter);
+    // Replaces the play queue by library tracks and plays from start (index in the queue).
+    void play_queue(Device &d, const std::vector<const LibraryTrack *> &queue, int32_t start);
 
     // Playback clock: advances every playing device by elapsed milliseconds and pushes
     // their positions.
