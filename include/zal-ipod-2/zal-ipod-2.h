@@ -1125,6 +1125,129 @@ ZAL_API int zal_ipod_get_playlist_info_sync(zal_ipod_handle *h, int a, int b, ui
  * Categories, filtered queries, the selection stack and playing a selection.
  * ---------------------------------------------------------------------------------- */
 
+/* Category numbers: 0 TOP, 1 PLAYLIST, 2 ARTIST, 3 ALBUM, 4 GENRE, 5 TRACK, 6 COMPOSER,
+ * 7 AUDIOBOOK, 8 PODCAST, 9 NESTED_PLAYLIST, 10 GENIUS_MIXES, 11 ITUNES_U. */
+#define ZAL_MEDIA_LIB_SELECTION_LEVELS 256
+/* Most identifiers a selection plays (longer lists are cut to their first entries). */
+#define ZAL_MEDIA_LIB_MAX_PLAY_ITEMS 8000
+
+/* The name of a category number ("TRACK"); "UNKNOWN" outside 0 to 11. Constant string;
+ * any thread. */
+ZAL_API const char *zal_ipod_category_to_string(int category);
+/* The number of a category name, exact and case-sensitive, for "PLAYLIST" to "ITUNES_U";
+ * 0 for any other text (also "TOP", "UNKNOWN" and NULL). Any thread. */
+ZAL_API int zal_ipod_string_to_category(const char *name);
+
+/* Lists handed out by the browser (char ** results) are new arrays followed by one NULL
+ * entry; unless a function says otherwise the caller frees each string and the array with
+ * free(). The browser's state (the selection stack) has no lock: one thread walks it. */
+
+/* GET_COLLECTION_ID [category_name, item_index]: the collection identifier of an item of a
+ * top-level category. */
+ZAL_API int zal_ipod_get_collection_identifier(zal_ipod_handle *h, const char *category_name,
+                                               int item_index);
+/* As zal_ipod_get_collection_identifier: the reply's "collection_id" text (an unsigned
+ * 64-bit number), owned by the handle until the next call; NULL without one. */
+ZAL_API const char *zal_ipod_get_collection_identifier_sync(zal_ipod_handle *h,
+                                                            const char *category_name,
+                                                            int item_index);
+/* COUNT_ITEMS_IDENTIFIER_CURRENT_FILTER [levels, names of the current filter...]. */
+ZAL_API int zal_ipod_count_item_identifiers_current_filter(zal_ipod_handle *h);
+/* As zal_ipod_count_item_identifiers_current_filter: the reply's "count_item_identifiers",
+ * -1 without one. */
+ZAL_API int zal_ipod_count_item_identifiers_current_filter_sync(zal_ipod_handle *h);
+/* GET_ITEMS_IDENTIFIER_CURRENT_FILTER [levels, offset, count, identifiers_only, names...]. */
+ZAL_API int zal_ipod_get_items_identifier_current_filter(zal_ipod_handle *h, int offset, int count,
+                                                         int identifiers_only);
+/* As zal_ipod_get_items_identifier_current_filter: the strings of the reply after its first
+ * element: per item its identifier (identifiers_only 1), or identifier, name, duration,
+ * artist, album and genre (0). The strings stay owned by the handle until the next such
+ * query; the caller frees only the array. NULL without a reply or for an empty one. */
+ZAL_API const char **zal_ipod_get_item_identifiers_current_filter_sync(zal_ipod_handle *h,
+                                                                       int offset, int count,
+                                                                       int identifiers_only);
+/* COUNT_ITEMS_CURRENT_CATEGORY [levels, names of the current filter...]. */
+ZAL_API int zal_ipod_count_items_current_category(zal_ipod_handle *h);
+/* As zal_ipod_count_items_current_category: the reply's "count_items_category", -1 without. */
+ZAL_API int zal_ipod_count_items_current_category_sync(zal_ipod_handle *h);
+/* GET_ITEMS_CURRENT_CATEGORY [levels, offset, count, names of the current filter...]. */
+ZAL_API int zal_ipod_get_items_current_category(zal_ipod_handle *h, int offset, int count);
+/* As zal_ipod_get_items_current_category: the reply becomes the records cache
+ * (zal_ipod_record) and the names of items offset to offset+count-1 come back as a new list
+ * of count strings ("" for items the reply did not hold); NULL without a reply. */
+ZAL_API char **zal_ipod_get_items_current_category_sync(zal_ipod_handle *h, int offset, int count);
+
+/* Number of categories offered beneath the item on top (11 with nothing selected, 0 under a
+ * leaf); -1 with an error text while a category is on top. */
+ZAL_API int zal_ipod_media_lib_get_categories_count(zal_ipod_handle *h);
+/* The names of those categories as a new list; NULL with an error text while a category is
+ * on top. */
+ZAL_API char **zal_ipod_media_lib_get_categories(zal_ipod_handle *h);
+/* Number of items of the category on top (iAP2: asked; iAP1: the last record count),
+ * remembered in its level; -1 with an error text when no category is on top. */
+ZAL_API int zal_ipod_media_lib_get_items_count(zal_ipod_handle *h);
+/* The names of items offset to offset+count-1 of the category on top as a new list; the page
+ * is remembered for zal_ipod_media_lib_select_item. NULL when the page is not within the
+ * category (negative offset or count included) or the query failed. */
+ZAL_API char **zal_ipod_media_lib_get_items(zal_ipod_handle *h, int offset, int count);
+
+/* Starts the walk again at the top; iAP1 devices are sent category TOP and the hierarchy,
+ * iAP2 keep it for later. 1, or 0 when an iAP1 command failed. */
+ZAL_API int zal_ipod_media_lib_reset_selection(zal_ipod_handle *h, int hierarchy);
+/* Number of levels on the selection stack (0 to ZAL_MEDIA_LIB_SELECTION_LEVELS). */
+ZAL_API int zal_ipod_media_lib_get_current_selection_count(zal_ipod_handle *h);
+/* The names of the levels (the current filter), level 0 first, as a new list. */
+ZAL_API char **zal_ipod_media_lib_get_current_selection(zal_ipod_handle *h);
+/* Absolute index of the item on top, 0 when a category (or nothing) is on top. */
+ZAL_API int zal_ipod_media_lib_get_current_selection_start_index(zal_ipod_handle *h);
+/* Pushes a category beneath the item on top (or at the top). 1; 0 when the iAP1 command
+ * failed (the level is pushed all the same); -1 with an error text while a category is on
+ * top or the stack is full (nothing pushed, nothing sent). */
+ZAL_API int zal_ipod_media_lib_select_category(zal_ipod_handle *h, int category);
+/* Pushes item index of the page last fetched with zal_ipod_media_lib_get_items. 1; -1 with
+ * an error text when no category is on top, the index is outside the category or the stack
+ * is full. Nothing is sent. */
+ZAL_API int zal_ipod_media_lib_select_item(zal_ipod_handle *h, int index);
+/* Keeps levels 0 to keep-1 and selects them again on the device (keep 0: a reset with the
+ * stored hierarchy). 1; 0 when a step failed (the levels rebuilt so far stay); -1 with an
+ * error text when there are not more than keep levels. */
+ZAL_API int zal_ipod_media_lib_undo_selection(zal_ipod_handle *h, int keep);
+/* Plays the first (at most ZAL_MEDIA_LIB_MAX_PLAY_ITEMS) of count identifiers from entry
+ * start: iAP1 as a prepared identifier list, iAP2 as PLAYITEMS. The play command's result;
+ * 0 without sending when start is beyond the list. */
+ZAL_API int zal_ipod_media_lib_play_items(zal_ipod_handle *h, const uint64_t *uids, int count,
+                                          int start);
+/* Plays from where the walk stands, item index of the page on top (or of the category on
+ * top), as a collection, an identifier list or a database record by device protocol; the
+ * levels pushed on the way stay. 1, -1, or the failing step's result. */
+ZAL_API int zal_ipod_media_lib_play_current_selection(zal_ipod_handle *h, int index);
+/* Track information of tracks offset to offset+count-1 of the TRACK or AUDIOBOOK category on
+ * top, for the track field accessors: identifiers only (1) or whole records (0). Owned by
+ * the handle until the next request; NULL with an error text when another level is on top,
+ * NULL when the tracks are not there or the query failed. */
+ZAL_API const void *zal_ipod_media_lib_get_tracks_info(zal_ipod_handle *h, int identifiers_only,
+                                                       int offset, int count);
+/* Identifier of track i of the last zal_ipod_media_lib_get_tracks_info result; 1 or 0 (also
+ * for any other result or a track outside it). */
+ZAL_API int zal_ipod_media_lib_get_track_uid(zal_ipod_handle *h, const void *result, int i,
+                                             uint64_t *uid);
+/* Duration of track i (0 for identifier-only results on iAP2); 1 or 0. */
+ZAL_API int zal_ipod_media_lib_get_track_duration(zal_ipod_handle *h, const void *result, int i,
+                                                  uint32_t *duration);
+/* Name of track i as a new string the caller frees ("" when the result has none); 1 or 0. */
+ZAL_API int zal_ipod_media_lib_get_track_name(zal_ipod_handle *h, const void *result, int i,
+                                              char **text);
+/* Artist of track i, as zal_ipod_media_lib_get_track_name. */
+ZAL_API int zal_ipod_media_lib_get_track_artist(zal_ipod_handle *h, const void *result, int i,
+                                                char **text);
+/* Album of track i, as zal_ipod_media_lib_get_track_name. */
+ZAL_API int zal_ipod_media_lib_get_track_album(zal_ipod_handle *h, const void *result, int i,
+                                               char **text);
+/* Genre of track i, as zal_ipod_media_lib_get_track_name. */
+ZAL_API int zal_ipod_media_lib_get_track_genre(zal_ipod_handle *h, const void *result, int i,
+                                               char **text);
+
+
 /* ---- Connection state --------------------------------------------------------------------
  * Learning that the connection was lost and came back.
  * ---------------------------------------------------------------------------------- */

@@ -87,6 +87,28 @@ gval *zal_arg_array(std::initializer_list<gval *> items) {
     return array;
 }
 
+gval *zal_arg_ints_strings(std::initializer_list<int32_t> ints, const char *const *strings,
+                           int32_t n) {
+    if (n < 0 || (strings == nullptr && n > 0)) return nullptr;
+    gval *array =
+        serialize_array_reserve(static_cast<uint32_t>(ints.size()) + static_cast<uint32_t>(n));
+    if (array == nullptr) return nullptr;
+    for (int32_t v : ints) {
+        if (serialize_array_add(array, serialize_int(v)) != 0) {
+            serialize_free(array);
+            return nullptr;
+        }
+    }
+    for (int32_t i = 0; i < n; ++i) {
+        const char *s = strings[i] != nullptr ? strings[i] : "";
+        if (serialize_array_add(array, serialize_string(s)) != 0) {
+            serialize_free(array);
+            return nullptr;
+        }
+    }
+    return array;
+}
+
 namespace {
 // Stores the "error" text of a hash; true when there was one.
 bool take_error(zal_ipod_handle *h, const gval *hash) {
@@ -138,6 +160,14 @@ int32_t zal_cmd_sync(zal_ipod_handle *h, int tid, zal_record_decoder decode) {
     int32_t result = decode(h, reply);
     reply_record_free(reply);
     return result;
+}
+
+gval *zal_cmd_sync_value(zal_ipod_handle *h, int tid) {
+    if (h == nullptr) return nullptr;
+    zal_ipod_reply *reply = zal_ipod_wait_for_tid_ex(h, static_cast<uint16_t>(tid));
+    gval *v = zal_reply_value(reply);
+    reply_record_free(reply);
+    return v;
 }
 
 int32_t zal_cmd_sync_int(zal_ipod_handle *h, int tid) {

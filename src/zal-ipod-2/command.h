@@ -47,6 +47,10 @@ gval *zal_arg_struct(const void *p, uint32_t n);
 gval *zal_arg_ints(std::initializer_list<int32_t> items);
 // Array of already built items (owned); nullptr and every item freed if one is nullptr.
 gval *zal_arg_array(std::initializer_list<gval *> items);
+// Array of integers followed by n strings (a null text travels as ""), built with its
+// final size reserved: the filtered queries send their numbers, then a path of names.
+gval *zal_arg_ints_strings(std::initializer_list<int32_t> ints, const char *const *strings,
+                           int32_t n);
 // Byte string of n bytes from a caller's (pointer, signed length) pair; nullptr for a
 // negative length or a null pointer with bytes to copy, so that such a request is refused
 // rather than read from where it should not be. n 0 gives an empty byte string.
@@ -107,6 +111,9 @@ int32_t zal_cmd_sync_hash(zal_ipod_handle *h, int tid, zal_hash_reader read);
 // Same with a decoder that reads the record itself.
 using zal_record_decoder = int32_t (*)(zal_ipod_handle *h, const zal_ipod_reply *reply);
 int32_t zal_cmd_sync(zal_ipod_handle *h, int tid, zal_record_decoder decode);
+// Waits for tid and returns the decoded payload (the caller frees it), nullptr when no
+// reply or no payload came; for replies whose value outlives the wait.
+gval *zal_cmd_sync_value(zal_ipod_handle *h, int tid);
 
 // Reads an integer under key of a hash; fallback when absent or not an integer.
 int32_t zal_hash_int(const gval *hash, const char *key, int32_t fallback);

@@ -10,6 +10,7 @@
 #include <cstdint>
 
 #include "zal-ipod-2/zal-ipod-2.h"
+#include "zal-ipod-2/browser_state.h"
 #include "zal-ipod-2/device_control_state.h"
 #include "zal-ipod-2/device_info_state.h"
 #include "zal-ipod-2/family_state.h"
@@ -117,6 +118,7 @@ struct zal_ipod_handle {
     int32_t protocol = 0;
     zal_artwork_state artwork;
     zal_records_state records;
+    zal_browser_state browser;
     zal_voiceover_state voiceover;
     zal_device_info_state device_info;
 

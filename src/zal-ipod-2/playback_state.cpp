@@ -51,6 +51,7 @@ void zal_playback_cache_reset(zal_ipod_handle *h) {
     h->protocol = 0;
     h->artwork.reset();
     h->records.reset();
+    h->browser.reset();
 }
 
 zal_state_guard::zal_state_guard(zal_ipod_handle *h) : lock_(&h->state_lock) {

@@ -31,7 +31,8 @@ std::string slurp(const std::string &path) {
 }  // namespace
 
 ProgramResult run_program(const std::string &program, const std::vector<std::string> &args,
-                          int timeout_ms, const std::map<std::string, std::string> &env) {
+                          int timeout_ms, const std::map<std::string, std::string> &env,
+                          const std::string &stdin_path) {
     ProgramResult result;
     std::vector<std::string> argv_text;
     std::istringstream emulator(ZAL_TEST_EMULATOR);
@@ -56,7 +57,7 @@ ProgramResult run_program(const std::string &program, const std::vector<std::str
     const std::string out_path = base + ".out", err_path = base + ".err";
     posix_spawn_file_actions_t actions;
     posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, 0, "/dev/null", O_RDONLY, 0);
+    posix_spawn_file_actions_addopen(&actions, 0, stdin_path.c_str(), O_RDONLY, 0);
     posix_spawn_file_actions_addopen(&actions, 1, out_path.c_str(), O_WRONLY | O_CREAT | O_TRUNC,
                                      0600);
     posix_spawn_file_actions_addopen(&actions, 2, err_path.c_str(), O_WRONLY | O_CREAT | O_TRUNC,

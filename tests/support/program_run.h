@@ -16,8 +16,10 @@ struct ProgramResult {
 };
 
 // Starts program with args (and env overrides), waits at most timeout_ms, kills it after.
+// Standard input is read from stdin_path.
 ProgramResult run_program(const std::string &program, const std::vector<std::string> &args,
                           int timeout_ms = 20000,
-                          const std::map<std::string, std::string> &env = {});
+                          const std::map<std::string, std::string> &env = {},
+                          const std::string &stdin_path = "/dev/null");
 
 }  // namespace zaltest

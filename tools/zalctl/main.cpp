@@ -44,6 +44,7 @@ int main(int argc, char **argv) {
     add_playback_commands(app, session);
     add_device_info_commands(app, session);
     add_media_commands(app, session);
+    add_browse_commands(app, session);
 
     try {
         app.parse(argc, argv);

@@ -109,6 +109,7 @@ void add_playback_commands(CLI::App &app, Session &s);
 // info, eq, button, voiceover, call-state, eap (commands_device.cpp)
 void add_device_info_commands(CLI::App &app, Session &s);
 void add_media_commands(CLI::App &app, Session &s);      // db, library, playlist, play-items
+void add_browse_commands(CLI::App &app, Session &s);     // browse
 
 // Shared by status, transport and playback: the current track, as JSON (has_track, title,
 // artist, album, chapter, state, track_index, number_of_tracks, position_ms, length_ms,

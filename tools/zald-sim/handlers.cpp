@@ -24,6 +24,7 @@ HandlerTable make_handler_table() {
     register_device_handlers(table);
     register_comms_handlers(table);
     register_media_handlers(table);
+    register_browse_handlers(table);
     return table;
 }
 

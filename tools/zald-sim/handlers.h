@@ -59,5 +59,6 @@ void register_artwork_handlers(HandlerTable &table);
 void register_device_handlers(HandlerTable &table);
 void register_comms_handlers(HandlerTable &table);
 void register_media_handlers(HandlerTable &table);
+void register_browse_handlers(HandlerTable &table);
 
 }  // namespace sim

@@ -313,6 +313,16 @@ int32_t MediaLibrary::count(int32_t category, const Filter &filter) const {
     return static_cast<int32_t>(items(category, filter).size());
 }
 
+std::vector<const LibraryTrack *> MediaLibrary::listed(int32_t category,
+                                                      const Filter &filter) const {
+    std::vector<const LibraryTrack *> kept = tracks_under(filter);
+    if (!is_track_category(category)) return kept;
+    std::vector<const LibraryTrack *> tracks;
+    for (const LibraryTrack *t : kept)
+        if (of_kind(*t, category)) tracks.push_back(t);
+    return tracks;
+}
+
 uint64_t MediaLibrary::identifier(int32_t category, const std::string &name) const {
     if (is_playlist_category(category)) {
         for (const Playlist &p : playlists_)

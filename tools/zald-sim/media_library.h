@@ -106,6 +106,10 @@ class MediaLibrary {
     // for TOP.
     std::vector<std::string> items(int32_t category, const Filter &filter) const;
     int32_t count(int32_t category, const Filter &filter) const;
+    // The tracks a category lists under a filter, in the order of items(): for TRACK,
+    // AUDIOBOOK, PODCAST and ITUNES_U the listed items themselves, for any other category
+    // every track the filter keeps.
+    std::vector<const LibraryTrack *> listed(int32_t category, const Filter &filter) const;
     // Identifier of a collection: a play list's, or a stable number for an artist, album,
     // genre or composer name; 0 when there is no such item.
     uint64_t identifier(int32_t category, const std::string &name) const;
