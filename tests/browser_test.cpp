@@ -553,7 +553,9 @@ TEST_P(BrowserWalk, EveryStepSendsAnswersAndLeavesTheStackAsTabled) {
         zal_set_error_message(h, nullptr);
         LogCapture log;
         const Outcome got = step.act(h);
-        if (step.logged != nullptr) EXPECT_TRUE(log.contains(ANDROID_LOG_ERROR, step.logged));
+        if (step.logged != nullptr) {
+            EXPECT_TRUE(log.contains(ANDROID_LOG_ERROR, step.logged));
+        }
         EXPECT_EQ(got.result, step.expected.result);
         EXPECT_EQ(got.names, step.expected.names);
         ASSERT_TRUE(d.finish(3000)) << d.report();
