@@ -92,17 +92,8 @@ void artwork_library(benchmark::State &state, bool shared) {
 // reader reads (poll, then what is there).
 void artwork_raw(benchmark::State &state, bool shared) {
     PictureFile file;
-    Bytes answer = artwork_reply(shared ? &file.path() : nullptr);
-    MiniDaemon daemon(answer);
-    int so = daemon.connect_raw();
-    Bytes request = artwork_request();
-    Bytes reply(answer.size());
-    for (auto _ : state) {
-        write_all(so, request.data(), request.size());
-        if (!poll_read(so, reply.data(), reply.size())) state.SkipWithError("no reply");
-    }
+    raw_round_trips(state, artwork_request(), artwork_reply(shared ? &file.path() : nullptr));
     state.SetBytesProcessed(static_cast<int64_t>(state.iterations()) * kPixelBytes);
-    close(so);
 }
 
 }  // namespace

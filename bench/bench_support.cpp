@@ -124,6 +124,17 @@ void MiniDaemon::serve() {
     }
 }
 
+void raw_round_trips(benchmark::State &state, const Bytes &request, const Bytes &answer) {
+    MiniDaemon daemon(answer);
+    int so = daemon.connect_raw();
+    Bytes reply(answer.size());
+    for (auto _ : state) {
+        write_all(so, request.data(), request.size());
+        if (!poll_read(so, reply.data(), reply.size())) state.SkipWithError("no reply");
+    }
+    close(so);
+}
+
 namespace {
 
 // Remembers the time per iteration of every run for the ratio table.

@@ -46,6 +46,11 @@ class MiniDaemon {
     std::thread thread_;
 };
 
+// The floor of a request and its reply: a MiniDaemon answering `answer`, and per iteration
+// `request` written and the whole reply read over a raw socket, the way the library's reader
+// reads (poll, then what is there).
+void raw_round_trips(benchmark::State &state, const Bytes &request, const Bytes &answer);
+
 // Time per iteration (real time, in each benchmark's unit) by benchmark name.
 using Times = std::map<std::string, double>;
 

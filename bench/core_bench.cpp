@@ -51,15 +51,7 @@ void round_trip_library(benchmark::State &state) {
 }
 
 void round_trip_raw(benchmark::State &state) {
-    MiniDaemon daemon(int_reply());
-    int so = daemon.connect_raw();
-    Bytes request = keep_alive_request();
-    Bytes reply(int_reply().size());
-    for (auto _ : state) {
-        write_all(so, request.data(), request.size());
-        if (!poll_read(so, reply.data(), reply.size())) state.SkipWithError("no reply");
-    }
-    close(so);
+    raw_round_trips(state, keep_alive_request(), int_reply());
 }
 
 // ---- one large reply -------------------------------------------------------------------
@@ -88,17 +80,8 @@ void large_reply_library(benchmark::State &state) {
 }
 
 void large_reply_raw(benchmark::State &state) {
-    Bytes answer = large_reply();
-    MiniDaemon daemon(answer);
-    int so = daemon.connect_raw();
-    Bytes request = keep_alive_request();
-    Bytes reply(answer.size());
-    for (auto _ : state) {
-        write_all(so, request.data(), request.size());
-        if (!poll_read(so, reply.data(), reply.size())) state.SkipWithError("no reply");
-    }
+    raw_round_trips(state, keep_alive_request(), large_reply());
     state.SetBytesProcessed(static_cast<int64_t>(state.iterations()) * kLargeReply);
-    close(so);
 }
 
 // ---- event delivery --------------------------------------------------------------------
