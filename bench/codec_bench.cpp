@@ -13,10 +13,10 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <map>
 #include <string>
 #include <vector>
 
+#include "bench_support.h"
 #include "zal-ipod-2/serialize.h"
 
 namespace {
@@ -197,86 +197,73 @@ void ours_decode(benchmark::State &state, const Payload *p) {
     serialize_free(v);
 }
 
+// A payload as msgpack-c takes it: the same tree as a msgpack object (in a zone), and the
+// bytes msgpack-c packs it into.
+class MsgpackPayload {
+  public:
+    explicit MsgpackPayload(const Payload *p) : value_(p->make()) {
+        msgpack_zone_init(&zone_, 4096);
+        to_msgpack(value_, &object, &zone_);
+        msgpack_sbuffer_init(&packed);
+        msgpack_packer pk;
+        msgpack_packer_init(&pk, &packed, msgpack_sbuffer_write);
+        msgpack_pack_object(&pk, object);
+    }
+    ~MsgpackPayload() {
+        msgpack_sbuffer_destroy(&packed);
+        msgpack_zone_destroy(&zone_);
+        serialize_free(value_);
+    }
+    MsgpackPayload(const MsgpackPayload &) = delete;
+    MsgpackPayload &operator=(const MsgpackPayload &) = delete;
+
+    msgpack_object object;
+    msgpack_sbuffer packed;
+
+  private:
+    gval *value_;
+    msgpack_zone zone_;
+};
+
 void msgpack_encode(benchmark::State &state, const Payload *p) {
-    gval *v = p->make();
-    msgpack_zone zone;
-    msgpack_zone_init(&zone, 4096);
-    msgpack_object o;
-    to_msgpack(v, &o, &zone);
+    MsgpackPayload m(p);
     for (auto _ : state) {
         msgpack_sbuffer sbuf;
         msgpack_sbuffer_init(&sbuf);
         msgpack_packer pk;
         msgpack_packer_init(&pk, &sbuf, msgpack_sbuffer_write);
-        msgpack_pack_object(&pk, o);
+        msgpack_pack_object(&pk, m.object);
         benchmark::DoNotOptimize(sbuf.data);
         msgpack_sbuffer_destroy(&sbuf);
     }
-    msgpack_zone_destroy(&zone);
-    serialize_free(v);
 }
 
 void msgpack_decode(benchmark::State &state, const Payload *p) {
-    gval *v = p->make();
-    msgpack_zone zone;
-    msgpack_zone_init(&zone, 4096);
-    msgpack_object o;
-    to_msgpack(v, &o, &zone);
-    msgpack_sbuffer sbuf;
-    msgpack_sbuffer_init(&sbuf);
-    msgpack_packer pk;
-    msgpack_packer_init(&pk, &sbuf, msgpack_sbuffer_write);
-    msgpack_pack_object(&pk, o);
+    MsgpackPayload m(p);
     for (auto _ : state) {
         msgpack_unpacked result;
         msgpack_unpacked_init(&result);
         size_t off = 0;
-        if (msgpack_unpack_next(&result, sbuf.data, sbuf.size, &off) != MSGPACK_UNPACK_SUCCESS)
+        if (msgpack_unpack_next(&result, m.packed.data, m.packed.size, &off) !=
+            MSGPACK_UNPACK_SUCCESS)
             state.SkipWithError("msgpack decode failed");
         benchmark::DoNotOptimize(result.data);
         msgpack_unpacked_destroy(&result);
     }
-    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * sbuf.size));
-    msgpack_sbuffer_destroy(&sbuf);
-    msgpack_zone_destroy(&zone);
-    serialize_free(v);
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * m.packed.size));
 }
 
 // msgpack-c's C decoder points strings and byte strings into the input buffer; this
 // baseline makes it copy them into its zone, so that the result owns its data like ours.
 void msgpack_decode_copy(benchmark::State &state, const Payload *p) {
-    gval *v = p->make();
-    msgpack_zone zone;
-    msgpack_zone_init(&zone, 4096);
-    msgpack_object o;
-    to_msgpack(v, &o, &zone);
-    msgpack_sbuffer sbuf;
-    msgpack_sbuffer_init(&sbuf);
-    msgpack_packer pk;
-    msgpack_packer_init(&pk, &sbuf, msgpack_sbuffer_write);
-    msgpack_pack_object(&pk, o);
+    MsgpackPayload m(p);
     auto never_reference = [](msgpack::type::object_type, std::size_t, void *) { return false; };
     for (auto _ : state) {
-        msgpack::object_handle oh = msgpack::unpack(sbuf.data, sbuf.size, never_reference);
+        msgpack::object_handle oh = msgpack::unpack(m.packed.data, m.packed.size, never_reference);
         benchmark::DoNotOptimize(oh.get().type);
     }
-    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * sbuf.size));
-    msgpack_sbuffer_destroy(&sbuf);
-    msgpack_zone_destroy(&zone);
-    serialize_free(v);
+    state.SetBytesProcessed(static_cast<int64_t>(state.iterations() * m.packed.size));
 }
-
-// Remembers the time per iteration of every run for the ratio table.
-class RecordingReporter : public benchmark::ConsoleReporter {
-  public:
-    void ReportRuns(const std::vector<Run> &runs) override {
-        for (const Run &r : runs)
-            if (r.run_type == Run::RT_Iteration && !r.error_occurred)
-                times[r.benchmark_name()] = r.GetAdjustedRealTime();
-        ConsoleReporter::ReportRuns(runs);
-    }
-    std::map<std::string, double> times;
-};
 
 }  // namespace
 
@@ -290,9 +277,7 @@ int main(int argc, char **argv) {
         benchmark::RegisterBenchmark(("decode_free/msgpack_zero_copy/" + n).c_str(), msgpack_decode,
                                      &p);
     }
-    benchmark::Initialize(&argc, argv);
-    RecordingReporter reporter;
-    benchmark::RunSpecifiedBenchmarks(&reporter);
+    const zalbench::Times times = zalbench::run_benchmarks(&argc, argv);
 
     const struct {
         const char *op;
@@ -304,17 +289,16 @@ int main(int argc, char **argv) {
     for (const auto &op : ops) {
         for (const Payload &p : kPayloads) {
             std::string suffix = std::string("/") + p.name;
-            auto ours = reporter.times.find(std::string(op.op) + "/ours" + suffix);
-            auto base = reporter.times.find(std::string(op.op) + "/msgpack" + suffix);
-            if (ours == reporter.times.end() || base == reporter.times.end()) continue;
-            auto zero_copy =
-                reporter.times.find(std::string(op.op) + "/msgpack_zero_copy" + suffix);
+            auto ours = times.find(std::string(op.op) + "/ours" + suffix);
+            auto base = times.find(std::string(op.op) + "/msgpack" + suffix);
+            if (ours == times.end() || base == times.end()) continue;
+            auto zero_copy = times.find(std::string(op.op) + "/msgpack_zero_copy" + suffix);
             double ratio = ours->second / base->second;
             bool ok = ratio <= op.target;
             missed += !ok;
             printf("%-14s %-12s %12.0f %12.0f %7.2f <= %.1f %-6s", op.op, p.name, ours->second,
                    base->second, ratio, op.target, ok ? "" : "MISSED");
-            if (zero_copy != reporter.times.end())
+            if (zero_copy != times.end())
                 printf("  (%.2f against msgpack-c zero-copy)", ours->second / zero_copy->second);
             printf("\n");
         }

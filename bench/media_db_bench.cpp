@@ -5,10 +5,10 @@
 #include <benchmark/benchmark.h>
 
 #include <cstdio>
-#include <map>
 #include <string>
 #include <vector>
 
+#include "bench_support.h"
 #include "zal-ipod-2/handle.h"
 #include "zal-ipod-2/media_db_state.h"
 #include "zal-ipod-2/zal-ipod-2.h"
@@ -93,17 +93,6 @@ void unserialize_only(benchmark::State &state) {
     state.SetItemsProcessed(static_cast<int64_t>(state.iterations()) * kTracks);
 }
 
-class RecordingReporter : public benchmark::ConsoleReporter {
-  public:
-    void ReportRuns(const std::vector<Run> &runs) override {
-        for (const Run &r : runs)
-            if (r.run_type == Run::RT_Iteration && !r.error_occurred)
-                times[r.benchmark_name()] = r.GetAdjustedRealTime();
-        ConsoleReporter::ReportRuns(runs);
-    }
-    std::map<std::string, double> times;
-};
-
 }  // namespace
 
 int main(int argc, char **argv) {
@@ -112,20 +101,12 @@ int main(int argc, char **argv) {
         ->Unit(benchmark::kMillisecond);
     benchmark::RegisterBenchmark("track_records/unserialize_only", unserialize_only)
         ->Unit(benchmark::kMillisecond);
-    benchmark::Initialize(&argc, argv);
-    RecordingReporter reporter;
-    benchmark::RunSpecifiedBenchmarks(&reporter);
-    int missed = 0;
-    auto ours = reporter.times.find("track_records/decode_and_read_all");
-    auto floor = reporter.times.find("track_records/unserialize_only");
-    if (ours != reporter.times.end() && floor != reporter.times.end()) {
-        const double ratio = ours->second / floor->second;
-        const bool ok = ratio <= 2.0;
-        printf("\n%-36s %10s %s\n", "comparison", "ratio", "target");
-        printf("%-36s %9.2fx <= 2.0x %s\n", "8000 track records vs unserialize", ratio,
-               ok ? "ok" : "MISSED");
-        missed = ok ? 0 : 1;
-    }
+    const zalbench::Times times = zalbench::run_benchmarks(&argc, argv);
+    const int missed = zalbench::print_ratios(
+        times,
+        {{"8000 track records vs unserialize", "track_records/decode_and_read_all",
+          "track_records/unserialize_only", false, 2.0}},
+        36);
     benchmark::Shutdown();
     return missed;
 }

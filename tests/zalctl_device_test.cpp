@@ -3,61 +3,18 @@
 #include <gtest/gtest.h>
 
 #include <nlohmann/json.hpp>
-#include <sstream>
 
-#include "e2e_fixture.h"
 #include "sim_fixture.h"
+#include "zalctl_fixture.h"
 
 namespace zaltest {
 namespace {
 
 using Json = nlohmann::json;
 
-ProgramResult zalctl(const std::vector<std::string> &args, int timeout_ms = 20000) {
-#ifdef ZALCTL_PATH
-    return run_program(ZALCTL_PATH, args, timeout_ms * kSlowdown);
-#else
-    (void)args, (void)timeout_ms;
-    return {};
-#endif
-}
+using ZalctlDeviceTest = ZalctlSuite;
 
-std::string joined(const std::vector<std::string> &args) {
-    std::string out = "zalctl";
-    for (const auto &a : args) out += " " + a;
-    return out;
-}
-
-size_t line_count(const std::string &text) {
-    size_t n = 0;
-    std::istringstream in(text);
-    for (std::string line; std::getline(in, line);) ++n;
-    return n;
-}
-
-class ZalctlDeviceTest : public EndToEndTest {
-  protected:
-    void SetUp() override {
-#ifndef ZALCTL_PATH
-        GTEST_SKIP() << "zalctl is not built";
-#endif
-        EndToEndTest::SetUp();
-    }
-};
-
-struct Case {
-    const char *name;
-    std::vector<std::string> args;
-    int status;
-    std::vector<std::string> out;  // texts standard output must hold
-    const char *err;               // text of the one stderr line, or null: empty stderr
-};
-
-void PrintTo(const Case &c, std::ostream *os) {
-    *os << c.name;
-}
-
-const Case kCases[] = {
+const CommandCase kCases[] = {
     {"info",
      {"info"},
      0,
@@ -97,23 +54,11 @@ const Case kCases[] = {
 };
 
 class ZalctlDeviceCommandTest : public ZalctlDeviceTest,
-                                public ::testing::WithParamInterface<Case> {};
+                                public ::testing::WithParamInterface<CommandCase> {};
 
 TEST_P(ZalctlDeviceCommandTest, PrintsAndExitsAsExpected) {
-    const Case &c = GetParam();
     start_sim();
-    const ProgramResult r = zalctl(c.args);
-    ASSERT_EQ(r.status, c.status) << joined(c.args) << "\nstdout:\n"
-                                  << r.out << "stderr:\n"
-                                  << r.err;
-    for (const std::string &text : c.out)
-        EXPECT_NE(r.out.find(text), std::string::npos) << text << " in\n" << r.out;
-    if (c.err == nullptr) {
-        EXPECT_EQ(r.err, "");
-    } else if (c.status == 1) {
-        EXPECT_EQ(line_count(r.err), 1u) << r.err;
-        EXPECT_EQ(r.err.rfind(std::string("zalctl: ") + c.err, 0), 0u) << r.err;
-    }
+    expect_command(GetParam());
 }
 
 INSTANTIATE_TEST_SUITE_P(BuiltInScenario, ZalctlDeviceCommandTest, ::testing::ValuesIn(kCases),
@@ -121,11 +66,6 @@ INSTANTIATE_TEST_SUITE_P(BuiltInScenario, ZalctlDeviceCommandTest, ::testing::Va
 
 TEST_F(ZalctlDeviceTest, JsonDocuments) {
     start_sim();
-    struct JsonCase {
-        std::vector<std::string> args;
-        const char *pointer;
-        Json expected;
-    };
     const JsonCase cases[] = {
         {{"--json", "info"}, "/lingos/0/version", "1.9"},
         {{"--json", "info"}, "/lingos/3/options", "0x0000000000000107"},
@@ -135,14 +75,7 @@ TEST_F(ZalctlDeviceTest, JsonDocuments) {
         {{"--json", "voiceover", "item"}, "/frame/3", 40},
         {{"--json", "button", "playpause"}, "/mask", 1},
     };
-    for (const JsonCase &c : cases) {
-        const ProgramResult r = zalctl(c.args);
-        ASSERT_EQ(r.status, 0) << joined(c.args) << "\n" << r.err;
-        ASSERT_EQ(line_count(r.out), 1u) << r.out;
-        const Json doc = Json::parse(r.out, nullptr, false);
-        ASSERT_FALSE(doc.is_discarded()) << r.out;
-        EXPECT_EQ(doc.at(Json::json_pointer(c.pointer)), c.expected) << joined(c.args);
-    }
+    for (const JsonCase &c : cases) expect_json(c);
 }
 
 // The device keeps what a run changed; the next run sees it.

@@ -3,41 +3,18 @@
 // their output and exit codes.
 #include <gtest/gtest.h>
 
-#include <algorithm>
 #include <nlohmann/json.hpp>
-#include <sstream>
 
-#include "e2e_fixture.h"
 #include "sim_fixture.h"
+#include "zalctl_fixture.h"
 
 namespace zaltest {
 namespace {
 
 using Json = nlohmann::json;
 
-ProgramResult zalctl(const std::vector<std::string> &args, int timeout_ms = 20000) {
-#ifdef ZALCTL_PATH
-    return run_program(ZALCTL_PATH, args, timeout_ms * kSlowdown, {});
-#else
-    (void)args, (void)timeout_ms;
-    return {};
-#endif
-}
-
-std::string joined(const std::vector<std::string> &args) {
-    std::string out = "zalctl";
-    for (const auto &a : args) out += " " + a;
-    return out;
-}
-
-class ZalctlMediaTest : public EndToEndTest {
+class ZalctlMediaTest : public ZalctlSuite {
   protected:
-    void SetUp() override {
-#ifndef ZALCTL_PATH
-        GTEST_SKIP() << "zalctl is not built";
-#endif
-        EndToEndTest::SetUp();
-    }
     // Runs zalctl, expecting the status; returns standard output.
     std::string run(const std::vector<std::string> &args, int status = 0) {
         const ProgramResult r = zalctl(args);
@@ -54,18 +31,6 @@ class ZalctlMediaTest : public EndToEndTest {
         return doc;
     }
 };
-
-struct CommandCase {
-    const char *name;
-    std::vector<std::string> args;
-    int status;
-    std::vector<std::string> out;  // texts standard output must hold
-    const char *err;               // text of the one stderr line, or null: empty stderr
-};
-
-void PrintTo(const CommandCase &c, std::ostream *os) {
-    *os << c.name;
-}
 
 const CommandCase kCommands[] = {
     {"db_categories",
@@ -125,21 +90,8 @@ class ZalctlMediaCommandTest : public ZalctlMediaTest,
                                public ::testing::WithParamInterface<CommandCase> {};
 
 TEST_P(ZalctlMediaCommandTest, PrintsAndExitsAsExpected) {
-    const CommandCase &c = GetParam();
     start_sim();
-    const ProgramResult r = zalctl(c.args);
-    ASSERT_EQ(r.status, c.status) << joined(c.args) << "\nstdout:\n"
-                                  << r.out << "stderr:\n"
-                                  << r.err;
-    for (const std::string &text : c.out)
-        EXPECT_NE(r.out.find(text), std::string::npos) << text << " in\n" << r.out;
-    if (c.err == nullptr) {
-        EXPECT_EQ(r.err, "");
-    } else {
-        EXPECT_NE(r.err.find(c.err), std::string::npos) << r.err;
-        EXPECT_EQ(std::count(r.err.begin(), r.err.end(), '\n'), 1) << r.err;
-        EXPECT_EQ(r.err.rfind("zalctl: ", 0), 0u) << r.err;
-    }
+    expect_command(GetParam());
 }
 
 INSTANTIATE_TEST_SUITE_P(BuiltInScenario, ZalctlMediaCommandTest, ::testing::ValuesIn(kCommands),

@@ -9,20 +9,11 @@
 #include <string>
 #include <vector>
 
-#include "e2e_fixture.h"
 #include "sim_fixture.h"
+#include "zalctl_fixture.h"
 
 namespace zaltest {
 namespace {
-
-ProgramResult zalctl(const std::vector<std::string> &args) {
-#ifdef ZALCTL_PATH
-    return run_program(ZALCTL_PATH, args, 20000 * kSlowdown);
-#else
-    (void)args;
-    return {};
-#endif
-}
 
 // A red album on a phone that shares its pictures through a file, and the same album on one
 // that sends them inline, most significant byte first.
@@ -36,17 +27,11 @@ const char *kArtworkScenario = R"json({
   ]
 })json";
 
-class ZalctlPlayback : public EndToEndTest {
+class ZalctlPlayback : public ZalctlSuite {
   protected:
-    void SetUp() override {
-#ifndef ZALCTL_PATH
-        GTEST_SKIP() << "zalctl is not built";
-#endif
-        EndToEndTest::SetUp();
-    }
     void TearDown() override {
         if (!png_path.empty()) unlink(png_path.c_str());
-        EndToEndTest::TearDown();
+        ZalctlSuite::TearDown();
     }
     // Runs zalctl and expects exit 0 with every text in standard output.
     void expect_output(const std::vector<std::string> &args,

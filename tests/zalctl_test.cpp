@@ -4,47 +4,17 @@
 #include <unistd.h>
 
 #include <nlohmann/json.hpp>
-#include <sstream>
 
-#include "e2e_fixture.h"
 #include "sim_fixture.h"
+#include "zalctl_fixture.h"
 
 namespace zaltest {
 namespace {
 
 using Json = nlohmann::json;
 
-ProgramResult zalctl(const std::vector<std::string> &args, int timeout_ms = 20000,
-                     const std::map<std::string, std::string> &env = {}) {
-#ifdef ZALCTL_PATH
-    return run_program(ZALCTL_PATH, args, timeout_ms * kSlowdown, env);
-#else
-    (void)args, (void)timeout_ms, (void)env;
-    return {};
-#endif
-}
-
-std::string joined(const std::vector<std::string> &args) {
-    std::string out = "zalctl";
-    for (const auto &a : args) out += " " + a;
-    return out;
-}
-
-std::vector<std::string> lines_of(const std::string &text) {
-    std::vector<std::string> lines;
-    std::istringstream in(text);
-    for (std::string line; std::getline(in, line);) lines.push_back(line);
-    return lines;
-}
-
-class ZalctlTest : public EndToEndTest {
+class ZalctlTest : public ZalctlSuite {
   protected:
-    void SetUp() override {
-#ifndef ZALCTL_PATH
-        GTEST_SKIP() << "zalctl is not built";
-#endif
-        EndToEndTest::SetUp();
-    }
     // Starts the simulator on a scenario given as JSON text.
     void start_scenario(const std::string &json,
                         const std::map<std::string, std::string> &env = {}) {
@@ -55,18 +25,6 @@ class ZalctlTest : public EndToEndTest {
 };
 
 // ---- Commands against the built-in scenario ------------------------------------------------
-
-struct CommandCase {
-    const char *name;
-    std::vector<std::string> args;
-    int status;
-    std::vector<std::string> out;  // texts standard output must hold
-    const char *err;               // text standard error must hold, or null: empty stderr
-};
-
-void PrintTo(const CommandCase &c, std::ostream *os) {
-    *os << c.name;
-}
 
 const CommandCase kCommands[] = {
     {"devices",
@@ -106,22 +64,8 @@ const CommandCase kCommands[] = {
 class ZalctlCommandTest : public ZalctlTest, public ::testing::WithParamInterface<CommandCase> {};
 
 TEST_P(ZalctlCommandTest, PrintsAndExitsAsExpected) {
-    const CommandCase &c = GetParam();
     start_sim();
-    const ProgramResult r = zalctl(c.args);
-    ASSERT_EQ(r.status, c.status) << joined(c.args) << "\nstdout:\n"
-                                  << r.out << "stderr:\n"
-                                  << r.err;
-    for (const std::string &text : c.out)
-        EXPECT_NE(r.out.find(text), std::string::npos) << text << " in\n" << r.out;
-    if (c.err == nullptr) {
-        EXPECT_EQ(r.err, "");
-    } else {
-        EXPECT_NE(r.err.find(c.err), std::string::npos) << r.err;
-        // A failure is one line on stderr, starting with the program's name.
-        EXPECT_EQ(lines_of(r.err).size(), 1u) << r.err;
-        EXPECT_EQ(r.err.rfind("zalctl: ", 0), 0u) << r.err;
-    }
+    expect_command(GetParam());
 }
 
 INSTANTIATE_TEST_SUITE_P(BuiltInScenario, ZalctlCommandTest, ::testing::ValuesIn(kCommands),
@@ -130,11 +74,6 @@ INSTANTIATE_TEST_SUITE_P(BuiltInScenario, ZalctlCommandTest, ::testing::ValuesIn
 // --json gives exactly one JSON document on standard output, nothing else.
 TEST_F(ZalctlTest, JsonOutputIsOneDocument) {
     start_sim();
-    struct JsonCase {
-        std::vector<std::string> args;
-        const char *pointer;
-        Json expected;
-    };
     const JsonCase cases[] = {
         {{"--json", "devices"}, "/devices/1/serial", "SIMPOD000002"},
         {{"--json", "status"}, "/now_playing/position_ms", 42000},
@@ -143,14 +82,7 @@ TEST_F(ZalctlTest, JsonOutputIsOneDocument) {
         {{"--json", "session", "open", "0"}, "/session/name", "Sim iPhone"},
         {{"--json", "config", "get", "socket_name"}, "/value", "zal.ipod.IPodDaemon"},
     };
-    for (const JsonCase &c : cases) {
-        const ProgramResult r = zalctl(c.args);
-        ASSERT_EQ(r.status, 0) << joined(c.args) << "\n" << r.err;
-        ASSERT_EQ(lines_of(r.out).size(), 1u) << r.out;
-        const Json doc = Json::parse(r.out, nullptr, false);
-        ASSERT_FALSE(doc.is_discarded()) << r.out;
-        EXPECT_EQ(doc.at(Json::json_pointer(c.pointer)), c.expected) << joined(c.args);
-    }
+    for (const JsonCase &c : cases) expect_json(c);
 }
 
 // ---- Transport ------------------------------------------------------------------------------

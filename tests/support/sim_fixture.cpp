@@ -40,6 +40,23 @@ void SimTest::open_session(RawClient &c, int32_t index) {
     ASSERT_EQ(reply->int_at("result"), 1);
 }
 
+void SimTest::expect_answer(uint8_t opcode, const gval *arg, uint8_t answer, const char *key,
+                            int32_t expected) {
+    auto reply = client->call(opcode, arg);
+    ASSERT_TRUE(reply.has_value());
+    ASSERT_EQ(reply->opcode, answer) << string_at(*reply, "error");
+    if (answer == kOpError) {
+        EXPECT_FALSE(string_at(*reply, "error").empty());
+    } else if (key != nullptr) {
+        EXPECT_EQ(reply->int_at(key), expected);
+    } else {
+        Value v = reply->value();
+        ASSERT_TRUE(v);
+        ASSERT_EQ(serialize_type(v.get()), SERIALIZE_INT);
+        EXPECT_EQ(serialize_get_int(v.get()), expected);
+    }
+}
+
 }  // namespace zaltest
 
 #include <unistd.h>

@@ -63,6 +63,11 @@ class SimTest : public ::testing::Test {
     std::unique_ptr<RawClient> connect();
     // Opens a session on device index and checks "result" 1.
     void open_session(RawClient &client, int32_t index);
+    // Sends opcode with arg on the client and checks the answer: an error with a message, or
+    // a return whose int under key (the int itself when key is null) is expected. The caller
+    // stops on HasFatalFailure().
+    void expect_answer(uint8_t opcode, const gval *arg, uint8_t answer, const char *key,
+                       int32_t expected);
 
     std::unique_ptr<SimProcess> sim;
     std::unique_ptr<RawClient> client;

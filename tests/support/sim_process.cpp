@@ -1,33 +1,18 @@
 // Child process control for the zald-sim tests.
 #include "sim_process.h"
 
-#include <fcntl.h>
 #include <signal.h>
-#include <spawn.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <atomic>
 #include <chrono>
 #include <cstdlib>
-#include <fstream>
-#include <sstream>
 #include <thread>
 
-extern char **environ;
+#include "child_process.h"
 
 namespace zaltest {
-
-namespace {
-
-std::string read_file(const std::string &path) {
-    std::ifstream in(path);
-    std::stringstream text;
-    text << in.rdbuf();
-    return text.str();
-}
-
-}  // namespace
 
 SimProcess::SimProcess(std::string program) : program_(std::move(program)) {
     const std::string base = "/tmp/" + unique_name("zald-sim-test");
@@ -47,40 +32,8 @@ std::string SimProcess::unique_name(const char *what) {
 }
 
 bool SimProcess::spawn(const std::vector<std::string> &args) {
-    // In a cross build the program runs through the emulator named at configure time.
-    std::vector<std::string> argv_text;
-    std::istringstream emulator(ZAL_TEST_EMULATOR);
-    for (std::string word; emulator >> word;) argv_text.push_back(word);
-    argv_text.push_back(program_);
-    argv_text.insert(argv_text.end(), args.begin(), args.end());
-    std::vector<char *> argv;
-    for (auto &a : argv_text) argv.push_back(a.data());
-    argv.push_back(nullptr);
-    // The environment of this process with the overrides applied.
-    std::vector<std::string> env_text;
-    for (char **e = environ; *e != nullptr; ++e) {
-        const std::string entry(*e);
-        if (!env_.count(entry.substr(0, entry.find('=')))) env_text.push_back(entry);
-    }
-    for (const auto &[key, value] : env_) env_text.push_back(key + "=" + value);
-    std::vector<char *> envp;
-    for (auto &e : env_text) envp.push_back(e.data());
-    envp.push_back(nullptr);
-    // posix_spawn rather than fork: no fork handlers run in the child, which matters under
-    // the user-mode emulator of cross builds.
-    posix_spawn_file_actions_t actions;
-    posix_spawn_file_actions_init(&actions);
-    posix_spawn_file_actions_addopen(&actions, 1, out_path_.c_str(), O_WRONLY | O_CREAT | O_TRUNC,
-                                     0600);
-    posix_spawn_file_actions_addopen(&actions, 2, err_path_.c_str(), O_WRONLY | O_CREAT | O_TRUNC,
-                                     0600);
-    const int failed = posix_spawnp(&pid_, argv[0], &actions, nullptr, argv.data(), envp.data());
-    posix_spawn_file_actions_destroy(&actions);
-    if (failed != 0) {
-        pid_ = -1;
-        return false;
-    }
-    return true;
+    pid_ = spawn_child(program_, args, env_, out_path_, err_path_);
+    return pid_ > 0;
 }
 
 bool SimProcess::start_listening(const std::vector<std::string> &args) {
@@ -111,21 +64,10 @@ int SimProcess::run_to_exit(const std::vector<std::string> &args, int timeout_ms
 }
 
 int SimProcess::wait_exit(int timeout_ms) {
-    for (int waited = 0; pid_ > 0; waited += 10) {
-        int status = 0;
-        if (waitpid(pid_, &status, WNOHANG) == pid_) {
-            pid_ = -1;
-            return WIFEXITED(status) ? WEXITSTATUS(status) : 128 + WTERMSIG(status);
-        }
-        if (waited >= timeout_ms) {
-            kill(pid_, SIGKILL);
-            waitpid(pid_, &status, 0);
-            pid_ = -1;
-            return -1;
-        }
-        std::this_thread::sleep_for(std::chrono::milliseconds(10));
-    }
-    return -1;
+    if (pid_ <= 0) return -1;
+    const int status = wait_child(pid_, timeout_ms);
+    pid_ = -1;
+    return status;
 }
 
 int SimProcess::stop(int sig) {
