@@ -261,18 +261,7 @@ void pb_track_info(Call &c) {
         count < 0)
         return c.fail("GET_PB_TRACK_INFO needs offset, count and identifiers_only");
     std::vector<LibraryTrack> queue;
-    for (const Track &t : d->spec.tracks) {
-        LibraryTrack lt;
-        lt.uid = t.uid;
-        lt.title = t.title;
-        lt.artist = t.artist;
-        lt.album = t.album;
-        lt.genre = t.genre;
-        lt.composer = t.composer;
-        lt.length_ms = t.length_ms;
-        lt.audiobook = t.audiobook;
-        queue.push_back(std::move(lt));
-    }
+    for (const Track &t : d->spec.tracks) queue.push_back(library_track_of(t));
     std::vector<const LibraryTrack *> pointers;
     for (const LibraryTrack &t : queue) pointers.push_back(&t);
     c.reply(track_records(pointers, offset, count, ids != 0));

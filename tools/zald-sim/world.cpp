@@ -11,6 +11,19 @@
 
 namespace sim {
 
+LibraryTrack library_track_of(const Track &t) {
+    LibraryTrack lt;
+    lt.uid = t.uid;
+    lt.title = t.title;
+    lt.artist = t.artist;
+    lt.album = t.album;
+    lt.genre = t.genre;
+    lt.composer = t.composer;
+    lt.length_ms = t.length_ms;
+    lt.audiobook = t.audiobook;
+    return lt;
+}
+
 namespace {
 
 // Seeking runs the clock this many times faster, backwards for rewind.
@@ -64,18 +77,7 @@ namespace {
 
 // The play queue's tracks belong to the library too, under the same identifiers.
 void add_queue_to_library(DeviceSpec &spec) {
-    for (Track &t : spec.tracks) {
-        LibraryTrack lt;
-        lt.uid = t.uid;
-        lt.title = t.title;
-        lt.artist = t.artist;
-        lt.album = t.album;
-        lt.genre = t.genre;
-        lt.composer = t.composer;
-        lt.length_ms = t.length_ms;
-        lt.audiobook = t.audiobook;
-        t.uid = spec.library.add_track(std::move(lt));
-    }
+    for (Track &t : spec.tracks) t.uid = spec.library.add_track(library_track_of(t));
 }
 
 }  // namespace

@@ -51,6 +51,9 @@ struct Track {
     std::vector<int32_t> artwork_times_ms;  // empty: the chapter starts, or 0
 };
 
+// A play-queue track as a media-library record (same identifier and fields).
+LibraryTrack library_track_of(const Track &t);
+
 // How a device hands out its pictures.
 struct ArtworkSpec {
     bool shared_file = true;  // false: pixels inline in the reply
