@@ -98,8 +98,10 @@ bool is_tag(unsigned char tag) {
            tag == 't';
 }
 
-gval *decode_array(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth);
-gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth);
+gval *decode_array(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth,
+                   ValueKey *key);
+gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth,
+                  ValueKey *key);
 
 // Set by any allocation that failed during the current decode on this thread. A short
 // input ends a container quietly (that is what the daemon sent), but a tree cut short for
@@ -117,50 +119,52 @@ bool allocated(bool ok) {
     return ok;
 }
 
-gval *decode_scalar(uint32_t kind, const unsigned char *p, uint64_t remaining, uint64_t *consumed) {
+// key, when given, is the hash key under which the value is stored; it is copied into the
+// value's own block (see ValueKey).
+gval *decode_scalar(uint32_t kind, const unsigned char *p, uint64_t remaining, uint64_t *consumed,
+                    ValueKey *key) {
     if (remaining < 5) return nullptr;
     uint32_t bits = get_be32(p + 1);  // big-endian on the wire
-    gval *v = allocated(value_new_blob(kind, &bits, 4));
+    gval *v = allocated(value_new_blob(kind, &bits, 4, key));
     if (v != nullptr) *consumed += 1 + static_cast<uint64_t>(p[0]);
     return v;
 }
 
-gval *decode_blob(uint32_t kind, const unsigned char *p, uint64_t remaining, uint64_t *consumed) {
+gval *decode_blob(uint32_t kind, const unsigned char *p, uint64_t remaining, uint64_t *consumed,
+                  ValueKey *key) {
     if (remaining < 4) return nullptr;
     uint32_t n = get_be32(p);
     if (n > remaining - 4) return nullptr;
-    gval *v = allocated(value_new_blob(kind, p + 4, n));
+    gval *v = allocated(value_new_blob(kind, p + 4, n, key));
     if (v != nullptr) *consumed += 4 + static_cast<uint64_t>(n);
     return v;
 }
 
 // Decodes the value whose tag has just been read. Inside arrays an unknown tag is a struct.
 gval *decode_tagged(unsigned char tag, const unsigned char *p, uint64_t remaining,
-                    uint64_t *consumed, unsigned depth) {
+                    uint64_t *consumed, unsigned depth, ValueKey *key = nullptr) {
     switch (tag) {
         case 'i':
-            return decode_scalar(SERIALIZE_INT, p, remaining, consumed);
+            return decode_scalar(SERIALIZE_INT, p, remaining, consumed, key);
         case 'f':
-            return decode_scalar(SERIALIZE_FLOAT, p, remaining, consumed);
+            return decode_scalar(SERIALIZE_FLOAT, p, remaining, consumed, key);
         case 's':
-            return decode_blob(SERIALIZE_STRING, p, remaining, consumed);
+            return decode_blob(SERIALIZE_STRING, p, remaining, consumed, key);
         case 'b':
-            return decode_blob(SERIALIZE_BYTES, p, remaining, consumed);
+            return decode_blob(SERIALIZE_BYTES, p, remaining, consumed, key);
         case 'a':
-            return decode_array(p, remaining, consumed, depth);
+            return decode_array(p, remaining, consumed, depth, key);
         case 'h':
-            return decode_hash(p, remaining, consumed, depth);
+            return decode_hash(p, remaining, consumed, depth, key);
         default:
-            return decode_blob(SERIALIZE_STRUCT, p, remaining, consumed);
+            return decode_blob(SERIALIZE_STRUCT, p, remaining, consumed, key);
     }
 }
 
-// Reads the common container header; false when the container is empty (count 0 or a
-// truncated header), in which case it counts as 8 bytes after the tag.
-bool container_header(const unsigned char *p, uint64_t remaining, uint32_t *count) {
-    if (remaining < 8) return false;
-    *count = get_be32(p + 4);
-    return *count != 0;
+// Reads the common container header: the declared count, 0 when the container is empty
+// (count 0 or a truncated header, which counts as 8 bytes after the tag).
+uint32_t container_count(const unsigned char *p, uint64_t remaining) {
+    return remaining < 8 ? 0 : get_be32(p + 4);
 }
 
 // Room reserved up front for a container's declared count, bounded by what the input
@@ -171,43 +175,41 @@ uint32_t plausible_count(uint32_t count, uint64_t remaining, uint64_t min_size) 
     return count < n ? count : static_cast<uint32_t>(n);
 }
 
-gval *decode_array(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth) {
+gval *decode_array(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth,
+                   ValueKey *key) {
     if (depth > kMaxDepth) return nullptr;
-    gval *array = allocated(serialize_array());
+    const uint32_t count = container_count(p, remaining);
+    gval *array =
+        allocated(value_new_array(plausible_count(count, remaining, kMinElementSize), key));
     if (array == nullptr) return nullptr;
-    uint32_t count = 0;
     uint64_t pos = 8;
-    if (container_header(p, remaining, &count) &&
-        allocated(value_array_presize(array, plausible_count(count, remaining, kMinElementSize)))) {
-        for (uint32_t i = 0; i < count && pos < remaining; ++i) {
-            uint64_t used = 0;
-            gval *item = decode_tagged(p[pos], p + pos + 1, remaining - pos - 1, &used, depth + 1);
-            if (item == nullptr) break;
-            if (!allocated(serialize_array_add(array, item) == 0)) break;
-            pos += 1 + used;
-        }
+    for (uint32_t i = 0; i < count && pos < remaining; ++i) {
+        uint64_t used = 0;
+        gval *item = decode_tagged(p[pos], p + pos + 1, remaining - pos - 1, &used, depth + 1);
+        if (item == nullptr) break;
+        gval_array *body = value_array_body(array);
+        if (body->count < body->capacity)  // the usual case: the room was reserved above
+            body->items[body->count++] = item;
+        else if (!allocated(serialize_array_add(array, item) == 0))
+            break;
+        pos += 1 + used;
     }
     *consumed += pos;
     return array;
 }
 
 // Finds keys already present in a hash under construction. Small hashes are scanned,
-// comparing a fingerprint of each key before the bytes; larger ones get a temporary index
-// (its keys point into the hash's own copies, which never move).
+// comparing lengths before bytes; larger ones get a temporary index whose keys point at
+// the hash's own key texts (re-pointed when a duplicate replaces an entry's key).
 class KeyIndex {
   public:
-    static uint32_t fingerprint(const char *key, std::size_t length) {
-        uint32_t h = 2166136261u;  // FNV-1a
-        for (std::size_t i = 0; i < length; ++i)
-            h = (h ^ static_cast<unsigned char>(key[i])) * 16777619u;
-        return h;
-    }
-
     // Entry index of key, -1 when absent, -2 when out of memory.
-    int32_t find(const gval_hash *body, const char *key, uint32_t print) {
+    int32_t find(const gval_hash *body, std::string_view key) {
         if (body->count <= kHashScanLimit) {
             for (int32_t i = 0; i < body->count; ++i)
-                if (prints_[i] == print && std::strcmp(body->keys[i], key) == 0) return i;
+                if (lengths_[i] == key.size() &&
+                    std::memcmp(body->keys[i], key.data(), key.size()) == 0)
+                    return i;
             return -1;
         }
         try {
@@ -220,75 +222,74 @@ class KeyIndex {
         return it == index_.end() ? -1 : it->second;
     }
 
-    void added(int32_t index, uint32_t print) {
-        if (index >= 0 && index < kHashScanLimit) prints_[index] = print;
+    void added(int32_t index, std::size_t length) {
+        if (index >= 0 && index < kHashScanLimit) lengths_[index] = static_cast<uint16_t>(length);
+    }
+
+    // Entry `index` is about to take new_key (equal bytes) in place of its current key,
+    // which is released: the index must stop pointing at the old text.
+    void rekey(const gval_hash *body, int32_t index, const char *new_key) {
+        if (index >= indexed_) return;
+        auto node = index_.extract(std::string_view(body->keys[index]));
+        if (node.empty()) return;
+        node.key() = std::string_view(new_key, node.key().size());
+        index_.insert(std::move(node));
     }
 
   private:
-    uint32_t prints_[kHashScanLimit] = {};
+    uint16_t lengths_[kHashScanLimit] = {};
     std::unordered_map<std::string_view, int32_t> index_;
     int32_t indexed_ = 0;
 };
 
-// Heap copy of a key from the input: at most kMaxKeyLength bytes, ending at a NUL.
-char *copy_key(const unsigned char *bytes, uint64_t length, std::size_t *kept) {
+// Length of a key as kept: at most kMaxKeyLength bytes, ending at a NUL.
+std::size_t key_length_kept(const unsigned char *bytes, uint64_t length) {
     std::size_t n = length > kMaxKeyLength ? kMaxKeyLength : static_cast<std::size_t>(length);
-    const void *nul = std::memchr(bytes, 0, n);
-    if (nul != nullptr)
-        n = static_cast<std::size_t>(static_cast<const unsigned char *>(nul) - bytes);
-    auto *key = static_cast<char *>(std::malloc(n + 1));
-    if (key == nullptr) return nullptr;
-    std::memcpy(key, bytes, n);
-    key[n] = '\0';
-    *kept = n;
-    return key;
+    for (std::size_t i = 0; i < n; ++i)
+        if (bytes[i] == 0) return i;
+    return n;
 }
 
-gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth) {
+gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth,
+                  ValueKey *own_key) {
     if (depth > kMaxDepth) return nullptr;
-    gval *hash = allocated(serialize_hash());
+    const uint32_t count = container_count(p, remaining);
+    gval *hash =
+        allocated(value_new_hash(plausible_count(count, remaining, kMinEntrySize), own_key));
     if (hash == nullptr) return nullptr;
-    uint32_t count = 0;
     uint64_t pos = 8;
-    if (container_header(p, remaining, &count) &&
-        allocated(value_hash_presize(hash, plausible_count(count, remaining, kMinEntrySize)))) {
-        KeyIndex keys;
-        for (uint32_t i = 0; i < count && pos < remaining; ++i) {
-            if (remaining - pos < 2) break;
-            uint64_t key_length = (static_cast<uint64_t>(p[pos]) << 8) | p[pos + 1];
-            // the key and the value's tag must be there
-            if (remaining - pos - 2 < key_length + 1) break;
-            const unsigned char *key_bytes = p + pos + 2;
-            pos += 2 + key_length;
-            unsigned char tag = p[pos++];
-            if (!is_tag(tag)) continue;  // unknown value kind: the entry is dropped
-            uint64_t used = 0;
-            gval *value = decode_tagged(tag, p + pos, remaining - pos, &used, depth + 1);
-            if (value == nullptr) break;
-            pos += used;
-            std::size_t kept = 0;
-            char *key = allocated(copy_key(key_bytes, key_length, &kept));
-            if (key == nullptr) {
-                serialize_free(value);
-                break;
-            }
-            uint32_t print = KeyIndex::fingerprint(key, kept);
-            int32_t at = keys.find(value_hash_body(hash), key, print);
-            if (at >= 0) {
-                std::free(key);
-                value_hash_replace(hash, at, value);
-                continue;
-            }
-            if (at == -2) {
-                decode_out_of_memory = true;
-                std::free(key);
-                serialize_free(value);
-                break;
-            }
-            at = value_hash_append_owned(hash, key, value);
-            if (!allocated(at >= 0)) break;
-            keys.added(at, print);
+    KeyIndex keys;
+    for (uint32_t i = 0; i < count && pos < remaining; ++i) {
+        if (remaining - pos < 2) break;
+        uint64_t key_length = (static_cast<uint64_t>(p[pos]) << 8) | p[pos + 1];
+        // the key and the value's tag must be there
+        if (remaining - pos - 2 < key_length + 1) break;
+        const unsigned char *key_bytes = p + pos + 2;
+        pos += 2 + key_length;
+        unsigned char tag = p[pos++];
+        if (!is_tag(tag)) continue;  // unknown value kind: the entry is dropped
+        ValueKey key;
+        key.bytes = reinterpret_cast<const char *>(key_bytes);
+        key.length = key_length_kept(key_bytes, key_length);
+        uint64_t used = 0;
+        gval *value = decode_tagged(tag, p + pos, remaining - pos, &used, depth + 1, &key);
+        if (value == nullptr) break;
+        pos += used;
+        gval_hash *body = value_hash_body(hash);
+        int32_t at = keys.find(body, std::string_view(key.stored, key.length));
+        if (at >= 0) {
+            keys.rekey(body, at, key.stored);
+            value_hash_replace_inline(hash, at, value, key.stored);
+            continue;
         }
+        if (at == -2) {
+            decode_out_of_memory = true;
+            serialize_free(value);
+            break;
+        }
+        at = value_hash_append_inline(hash, value, key.stored);
+        if (!allocated(at >= 0)) break;
+        keys.added(at, key.length);
     }
     *consumed += pos;
     return hash;
@@ -410,20 +411,20 @@ ZAL_API unsigned char *serialize(const gval *v, uint32_t *len) {
 
 ZAL_API gval *unserialize(const unsigned char *buf, uint32_t len) {
     if (buf == nullptr || len == 0 || !is_tag(buf[0])) return nullptr;
-    return public_reader(nullptr, [&](uint64_t *used) {
-        return decode_tagged(buf[0], buf + 1, len - 1, used, 1);
-    });
+    return public_reader(
+        nullptr, [&](uint64_t *used) { return decode_tagged(buf[0], buf + 1, len - 1, used, 1); });
 }
 
 ZAL_API gval *serialize_int_unpack(const unsigned char *p, uint32_t remaining, uint32_t *consumed) {
-    return public_reader(
-        consumed, [&](uint64_t *used) { return decode_scalar(SERIALIZE_INT, p, remaining, used); });
+    return public_reader(consumed, [&](uint64_t *used) {
+        return decode_scalar(SERIALIZE_INT, p, remaining, used, nullptr);
+    });
 }
 
 ZAL_API gval *serialize_float_unpack(const unsigned char *p, uint32_t remaining,
                                      uint32_t *consumed) {
     return public_reader(consumed, [&](uint64_t *used) {
-        return decode_scalar(SERIALIZE_FLOAT, p, remaining, used);
+        return decode_scalar(SERIALIZE_FLOAT, p, remaining, used, nullptr);
     });
 }
 
@@ -432,20 +433,20 @@ ZAL_API gval *serialize_string_unpack(const unsigned char *p, uint32_t remaining
     uint32_t k = kind == SERIALIZE_STRING || kind == SERIALIZE_BYTES
                      ? static_cast<uint32_t>(kind)
                      : static_cast<uint32_t>(SERIALIZE_STRUCT);
-    return public_reader(consumed,
-                         [&](uint64_t *used) { return decode_blob(k, p, remaining, used); });
+    return public_reader(
+        consumed, [&](uint64_t *used) { return decode_blob(k, p, remaining, used, nullptr); });
 }
 
 ZAL_API gval *serialize_array_unpack(const unsigned char *p, uint32_t remaining,
                                      uint32_t *consumed) {
-    return public_reader(consumed,
-                         [&](uint64_t *used) { return decode_array(p, remaining, used, 1); });
+    return public_reader(
+        consumed, [&](uint64_t *used) { return decode_array(p, remaining, used, 1, nullptr); });
 }
 
 ZAL_API gval *serialize_hash_unpack(const unsigned char *p, uint32_t remaining,
                                     uint32_t *consumed) {
-    return public_reader(consumed,
-                         [&](uint64_t *used) { return decode_hash(p, remaining, used, 1); });
+    return public_reader(
+        consumed, [&](uint64_t *used) { return decode_hash(p, remaining, used, 1, nullptr); });
 }
 
 }  // extern "C"

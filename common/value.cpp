@@ -6,6 +6,7 @@
 // (0, NULL, -1) and changing nothing; the wire decoder never produces such calls, but
 // application code handed a reply it did not expect must not crash on it.
 #include <climits>
+#include <cstddef>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
@@ -21,14 +22,46 @@ bool is_kind(const gval *v, uint32_t kind) {
     return v != nullptr && v->type == kind;
 }
 
-gval *new_container(uint32_t kind, void *body) {
+// Offset of a key copied into a value's block: the first address at or after `used` bytes
+// that is 1 modulo 8 (blocks start at multiples of 8).
+std::size_t key_offset(std::size_t used) {
+    return ((used + 6) & ~std::size_t{7}) + 1;
+}
+
+static_assert(alignof(std::max_align_t) >= 8,
+              "keys in value blocks rely on 8-byte malloc alignment");
+
+// Allocates a value record with `used` bytes for the record and its payload, plus room for
+// the key's copy when key is given (then written, and key->stored set).
+gval *allocate_value(std::uint64_t used, ValueKey *key) {
+    if (used > SIZE_MAX - 8) return nullptr;  // also keeps key_offset() from wrapping
+    std::uint64_t total = used;
+    if (key != nullptr)
+        total = key_offset(static_cast<std::size_t>(used)) + std::uint64_t{key->length} + 1;
+    if (total > SIZE_MAX) return nullptr;
+    auto *v = static_cast<gval *>(std::malloc(static_cast<std::size_t>(total)));
+    if (v == nullptr) return nullptr;
+    if (key != nullptr) {
+        char *stored = reinterpret_cast<char *>(v) + key_offset(static_cast<std::size_t>(used));
+        if (key->length > 0) std::memcpy(stored, key->bytes, key->length);
+        stored[key->length] = '\0';
+        key->stored = stored;
+    }
+    return v;
+}
+
+gval *new_container(uint32_t kind, void *body, ValueKey *key = nullptr) {
     if (body == nullptr) return nullptr;
-    auto *v = static_cast<gval *>(std::malloc(sizeof(gval)));
+    gval *v = allocate_value(sizeof(gval), key);
     if (v == nullptr) return nullptr;
     v->type = kind;
     v->data = body;
     v->len = 0;
     return v;
+}
+
+void free_key(char *key) {
+    if (!value_key_in_value_block(key)) std::free(key);
 }
 
 // Grows a pointer array to new_capacity slots; false (array unchanged) on failure.
@@ -58,10 +91,9 @@ bool hash_make_room(gval_hash *body) {
 
 }  // namespace
 
-gval *value_new_blob(uint32_t kind, const void *p, uint32_t n) {
+gval *value_new_blob(uint32_t kind, const void *p, uint32_t n, ValueKey *key) {
     if (n > 0 && p == nullptr) return nullptr;
-    if (static_cast<std::uint64_t>(n) + sizeof(gval) + 1 > SIZE_MAX) return nullptr;
-    auto *v = static_cast<gval *>(std::malloc(sizeof(gval) + static_cast<std::size_t>(n) + 1));
+    gval *v = allocate_value(std::uint64_t{sizeof(gval)} + n + 1, key);
     if (v == nullptr) return nullptr;
     auto *payload = reinterpret_cast<unsigned char *>(v + 1);
     v->type = kind;
@@ -72,10 +104,10 @@ gval *value_new_blob(uint32_t kind, const void *p, uint32_t n) {
     return v;
 }
 
-int value_hash_append_owned(gval *h, char *key, gval *value) {
+static int hash_append(gval *h, char *key, gval *value) {
     gval_hash *body = value_hash_body(h);
     if (key == nullptr || !hash_make_room(body)) {
-        std::free(key);
+        free_key(key);
         serialize_free(value);
         return -1;
     }
@@ -85,7 +117,11 @@ int value_hash_append_owned(gval *h, char *key, gval *value) {
 }
 
 int value_hash_append(gval *h, const char *key, gval *value) {
-    return value_hash_append_owned(h, strdup(key), value);
+    return hash_append(h, strdup(key), value);
+}
+
+int value_hash_append_inline(gval *h, gval *value, char *key) {
+    return hash_append(h, key, value);
 }
 
 // Capacity that doubling from the default reaches for n items; -1 when out of range.
@@ -98,28 +134,68 @@ static int32_t grown_capacity(int32_t capacity, uint32_t n) {
     return cap;
 }
 
-bool value_array_presize(gval *a, uint32_t n) {
-    gval_array *body = value_array_body(a);
-    if (n <= static_cast<uint32_t>(body->capacity)) return true;
-    int32_t cap = grown_capacity(body->capacity, n);
-    if (cap < 0 || !grow(&body->items, cap)) return false;
-    body->capacity = cap;
-    return true;
+gval *value_new_array(uint32_t n, ValueKey *key) {
+    int32_t cap = grown_capacity(kDefaultCapacity, n);
+    gval_array *body = cap < 0 ? nullptr : serialize_array_new_reserve(static_cast<uint32_t>(cap));
+    gval *v = new_container(SERIALIZE_ARRAY, body, key);
+    if (v == nullptr && body != nullptr) {
+        std::free(body->items);
+        std::free(body);
+    }
+    return v;
 }
 
-bool value_hash_presize(gval *h, uint32_t n) {
-    gval_hash *body = value_hash_body(h);
-    if (n <= static_cast<uint32_t>(body->capacity)) return true;
-    int32_t cap = grown_capacity(body->capacity, n);
-    if (cap < 0 || !grow(&body->keys, cap) || !grow(&body->values, cap)) return false;
-    body->capacity = cap;
-    return true;
+gval *value_new_hash(uint32_t n, ValueKey *key) {
+    int32_t cap = grown_capacity(kDefaultCapacity, n);
+    gval_hash *body = cap < 0 ? nullptr : serialize_hash_new_reserve(static_cast<uint32_t>(cap));
+    gval *v = new_container(SERIALIZE_HASH, body, key);
+    if (v == nullptr && body != nullptr) {
+        std::free(body->keys);
+        std::free(body->values);
+        std::free(body);
+    }
+    return v;
 }
 
-void value_hash_replace(gval *h, int32_t i, gval *value) {
+bool value_hash_replace(gval *h, int32_t i, gval *value) {
     gval_hash *body = value_hash_body(h);
+    if (value_key_in_value_block(body->keys[i])) {
+        // The key goes with the old value: the entry needs a copy of its own first.
+        char *copy = strdup(body->keys[i]);
+        if (copy == nullptr) {
+            ZAL_LOGE("serialize_hash_add: no memory for a copy of the key \"%s\"\n", body->keys[i]);
+            serialize_free(value);
+            return false;
+        }
+        body->keys[i] = copy;
+    }
     serialize_free(body->values[i]);
     body->values[i] = value;
+    return true;
+}
+
+void value_hash_replace_inline(gval *h, int32_t i, gval *value, char *key) {
+    gval_hash *body = value_hash_body(h);
+    free_key(body->keys[i]);
+    body->keys[i] = key;
+    serialize_free(body->values[i]);
+    body->values[i] = value;
+}
+
+gval *value_hash_take(gval *h, const char *key) {
+    if (!is_kind(h, SERIALIZE_HASH) || key == nullptr) return nullptr;
+    gval_hash *body = value_hash_body(h);
+    for (int32_t i = 0; i < body->count; ++i) {
+        if (std::strcmp(body->keys[i], key) != 0) continue;
+        gval *value = body->values[i];
+        free_key(body->keys[i]);
+        const auto tail = static_cast<std::size_t>(body->count - i - 1);
+        std::memmove(&body->keys[i], &body->keys[i + 1], sizeof(char *) * tail);
+        std::memmove(&body->values[i], &body->values[i + 1], sizeof(gval *) * tail);
+        body->count--;
+        return value;
+    }
+    return nullptr;
 }
 
 extern "C" {
@@ -355,10 +431,7 @@ ZAL_API int serialize_hash_add(gval *h, const char *key, gval *value) {
     }
     gval_hash *body = value_hash_body(h);
     for (int32_t i = 0; i < body->count; ++i) {
-        if (std::strcmp(body->keys[i], key) == 0) {
-            value_hash_replace(h, i, value);
-            return 0;
-        }
+        if (std::strcmp(body->keys[i], key) == 0) return value_hash_replace(h, i, value) ? 0 : -1;
     }
     return value_hash_append(h, key, value) < 0 ? -1 : 0;
 }
@@ -367,7 +440,7 @@ ZAL_API void serialize_hash_destroy(gval *h) {
     if (!is_kind(h, SERIALIZE_HASH) || h->data == nullptr) return;
     gval_hash *body = value_hash_body(h);
     for (int32_t i = 0; i < body->count; ++i) {
-        std::free(body->keys[i]);
+        free_key(body->keys[i]);  // a key in the value's block goes with the value
         serialize_free(body->values[i]);
     }
     std::free(body->keys);

@@ -1,26 +1,53 @@
-// Internals of the value tree shared with the codec.
+// Internals of the value tree shared with the codec and the library.
 #pragma once
+
+#include <cstddef>
+#include <cstdint>
 
 #include "zal-ipod-2/serialize.h"
 
+// A hash key that the decoder stores in the same heap block as the entry's value, after
+// the value's own bytes. Such a key sits at an address that is 1 modulo 8, where malloc
+// never puts a block, so the hash can tell it from a key copy of its own (strdup) by the
+// address alone: it is released with its value, never on its own. Keys in a value's block
+// only ever belong to the hash entry that holds that value.
+struct ValueKey {
+    const char *bytes = nullptr;  // the key's text, length bytes, no NUL inside
+    std::size_t length = 0;
+    char *stored = nullptr;  // set by the constructor: the NUL-terminated copy in the block
+};
+
+inline bool value_key_in_value_block(const char *key) {
+    return (reinterpret_cast<std::uintptr_t>(key) & 7u) == 1u;
+}
+
 // A scalar or blob value in one allocation: the record followed by n payload bytes and a
-// NUL. p may be null only when n is 0.
-gval *value_new_blob(uint32_t kind, const void *p, uint32_t n);
+// NUL, and the key's copy when key is given. p may be null only when n is 0.
+gval *value_new_blob(uint32_t kind, const void *p, uint32_t n, ValueKey *key = nullptr);
+
+// An empty array or hash whose capacity is what doubling from the default reaches for n
+// entries, its record carrying the key's copy when key is given. NULL when out of memory.
+gval *value_new_array(uint32_t n, ValueKey *key);
+gval *value_new_hash(uint32_t n, ValueKey *key);
 
 // Appends (key, value) to a hash known not to hold key; takes ownership of value (freed on
 // failure). Returns the new entry's index, or -1.
 int value_hash_append(gval *h, const char *key, gval *value);
 
-// Same, but key is a malloc'ed copy whose ownership passes to the hash (freed on failure).
-int value_hash_append_owned(gval *h, char *key, gval *value);
+// Same, for a value that carries its key in its block (key is that ValueKey's stored).
+int value_hash_append_inline(gval *h, gval *value, char *key);
 
-// Makes room for n items (never shrinks); the capacity stays a power-of-two multiple of
-// the default, as growth by doubling would have made it. False when out of memory.
-bool value_array_presize(gval *a, uint32_t n);
-bool value_hash_presize(gval *h, uint32_t n);
+// Replaces the value of entry i, freeing the old one; the entry keeps its key (copied
+// first when it lived in the old value's block). False, with value freed and the entry
+// unchanged, when that copy cannot be made.
+bool value_hash_replace(gval *h, int32_t i, gval *value);
 
-// Replaces the value of entry i (freeing the old one).
-void value_hash_replace(gval *h, int32_t i, gval *value);
+// Same, for a value that carries an equal key in its block: the entry takes that key.
+void value_hash_replace_inline(gval *h, int32_t i, gval *value, char *key);
+
+// Removes the entry under key from a hash and hands its value to the caller (NULL when
+// there is no such entry). The other entries keep their order.
+gval *value_hash_take(gval *h, const char *key);
 
 inline gval_array *value_array_body(const gval *a) {
     return static_cast<gval_array *>(a->data);

@@ -23,8 +23,8 @@
 // Only the thread that armed the countdown counts and fails: the fake daemon's thread and
 // the logger keep allocating normally.
 namespace {
-thread_local long fail_at = 0;    // 0: disarmed
-thread_local long seen = 0;       // allocations since arming
+thread_local long fail_at = 0;  // 0: disarmed
+thread_local long seen = 0;     // allocations since arming
 thread_local bool injected = false;
 
 bool fail_now() {
@@ -149,34 +149,55 @@ class AllocationFailure : public ::testing::Test {
 };
 
 TEST_F(AllocationFailure, Codec) {
-    gval *tree = hash_of({{"title", serialize_string("Alpha")},
-                          {"devices", device_list({device_entry("A", 1, 2), device_entry("B", 0, 1)})},
-                          {"bytes", serialize_bytes("\x01\x02\x03", 3)}});
+    gval *tree =
+        hash_of({{"title", serialize_string("Alpha")},
+                 {"devices", device_list({device_entry("A", 1, 2), device_entry("B", 0, 1)})},
+                 {"bytes", serialize_bytes("\x01\x02\x03", 3)}});
     uint32_t length = 0;
     unsigned char *encoded = serialize(tree, &length);
     ASSERT_NE(encoded, nullptr);
     const std::string reference(reinterpret_cast<char *>(encoded), length);
 
     gval *decoded = nullptr;
-    long decoding = sweep("unserialize", {[] {},
-                                          [&] {
-                                              decoded = unserialize(encoded, length);
-                                              return decoded != nullptr;
-                                          },
-                                          [&] {
-                                              // Whatever came back is whole or absent,
-                                              // never a tree that encodes differently.
-                                              if (decoded != nullptr && !injected) {
-                                                  uint32_t n = 0;
-                                                  unsigned char *again = serialize(decoded, &n);
-                                                  EXPECT_EQ(std::string(reinterpret_cast<char *>(again), n),
-                                                            reference);
-                                                  free(again);
-                                              }
-                                              serialize_free(decoded);
-                                              decoded = nullptr;
-                                          }});
+    long decoding =
+        sweep("unserialize", {[] {},
+                              [&] {
+                                  decoded = unserialize(encoded, length);
+                                  return decoded != nullptr;
+                              },
+                              [&] {
+                                  // Whatever came back is whole or absent,
+                                  // never a tree that encodes differently.
+                                  if (decoded != nullptr && !injected) {
+                                      uint32_t n = 0;
+                                      unsigned char *again = serialize(decoded, &n);
+                                      EXPECT_EQ(std::string(reinterpret_cast<char *>(again), n),
+                                                reference);
+                                      free(again);
+                                  }
+                                  serialize_free(decoded);
+                                  decoded = nullptr;
+                              }});
     EXPECT_GT(decoding, 5);
+
+    // Replacing a decoded entry: its key lives with the old value and is copied first.
+    gval *replacement = nullptr;
+    long replacing = sweep("replace a decoded entry",
+                           {[&] {
+                                decoded = unserialize(encoded, length);
+                                replacement = serialize_string("Beta");
+                            },
+                            [&] { return serialize_hash_add(decoded, "title", replacement) == 0; },
+                            [&] {
+                                const char *title =
+                                    serialize_get_string(serialize_hash_get(decoded, "title"));
+                                EXPECT_STREQ(title, injected ? "Alpha" : "Beta");
+                                EXPECT_STREQ(serialize_hash_get_key(decoded, 0), "title");
+                                serialize_free(decoded);
+                                decoded = nullptr;
+                            }});
+
+    EXPECT_EQ(replacing, 1);  // the key's copy, nothing else
 
     unsigned char *out = nullptr;
     sweep("serialize", {[] {},
@@ -214,24 +235,21 @@ TEST_F(AllocationFailure, CommandLine) {
     OwnedContextHolder holder;
     // parse_arguments may write into its arguments (the EAP list is cut in place), as a
     // daemon's own argv allows: every run gets fresh copies.
-    const std::vector<std::string> words = {"zald-2", "-u", "zal.test", "-e",
-                                            "com.example.one,com.example.two", "-a",
-                                            "ABCDE12345"};
+    const std::vector<std::string> words = {
+        "zald-2", "-u", "zal.test", "-e", "com.example.one,com.example.two", "-a", "ABCDE12345"};
     std::vector<std::string> copies;
     std::vector<char *> argv;
     context *ctx = nullptr;
-    sweep("parse_arguments", {[&] {
-                                  ctx = holder.fresh();
-                                  copies = words;
-                                  argv.clear();
-                                  for (auto &w : copies) argv.push_back(w.data());
-                                  argv.push_back(nullptr);
-                              },
-                              [&] {
-                                  return parse_arguments(static_cast<int>(words.size()),
-                                                         argv.data(), ctx) == 0;
-                              },
-                              [&] { holder.release(); }});
+    sweep("parse_arguments",
+          {[&] {
+               ctx = holder.fresh();
+               copies = words;
+               argv.clear();
+               for (auto &w : copies) argv.push_back(w.data());
+               argv.push_back(nullptr);
+           },
+           [&] { return parse_arguments(static_cast<int>(words.size()), argv.data(), ctx) == 0; },
+           [&] { holder.release(); }});
 }
 
 TEST_F(AllocationFailure, Connect) {
@@ -291,7 +309,9 @@ INSTANTIATE_TEST_SUITE_P(
         CommandCase{"play", ZAL_OP_PLAY, [] { return serialize_int(0); },
                     [](zal_ipod_handle *h) { return zal_ipod_play_sync(h) == 0; }},
         CommandCase{"get_config", ZAL_OP_GET_CONFIG,
-                    [] { return hash_of({{"config_val", serialize_string("zal.ipod.IPodDaemon")}}); },
+                    [] {
+                        return hash_of({{"config_val", serialize_string("zal.ipod.IPodDaemon")}});
+                    },
                     [](zal_ipod_handle *h) {
                         return zal_ipod_get_config_sync(h, "socket_name", config_value) == 1;
                     }},
@@ -309,16 +329,18 @@ INSTANTIATE_TEST_SUITE_P(
                                level == 55;
                     }},
         CommandCase{"bt_connection_status", ZAL_OP_GET_BT_CONNECTION_STATUS,
-                    [] { return hash_of({{"current_bt_status", serialize_string("connected")}}); },
+                    [] {
+                        return hash_of({{"current_bt_status", serialize_string("connected")}});
+                    },
                     [](zal_ipod_handle *h) {
                         char *status = zal_ipod_bt_connection_status_sync(h);
                         const bool ok = status != nullptr && strcmp(status, "connected") == 0;
                         free(status);
                         return ok;
                     }},
-        CommandCase{"stop_telephony_update", ZAL_OP_STOP_TELEPHONY_UPDATE,
-                    [] { return serialize_int(0); },
-                    [](zal_ipod_handle *h) { return zal_ipod_stop_telephony_update_sync(h) == 0; }}),
+        CommandCase{
+            "stop_telephony_update", ZAL_OP_STOP_TELEPHONY_UPDATE, [] { return serialize_int(0); },
+            [](zal_ipod_handle *h) { return zal_ipod_stop_telephony_update_sync(h) == 0; }}),
     [](const auto &info) { return std::string(info.param.name); });
 
 TEST_F(AllocationFailure, EventDispatch) {

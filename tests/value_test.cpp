@@ -128,6 +128,28 @@ TEST(Hash, KeysAreCopiedAndNullKeyLeavesValueWithCaller) {
     EXPECT_EQ(serialize_get_int(serialize_hash_get(h.get(), "19")), 19);
 }
 
+TEST(Hash, DecodedHashesStayEditable) {
+    // Decoded entries keep their keys beside their values; replacing a value of any kind
+    // must leave the entry's key readable and in place.
+    GvalPtr h(serialize_hash());
+    serialize_hash_add(h.get(), "n", serialize_int(1));
+    serialize_hash_add(h.get(), "s", serialize_string("text"));
+    serialize_hash_add(h.get(), "list", serialize_array());
+    serialize_hash_add(h.get(), "map", serialize_hash());
+    GvalPtr copy(serialize_dup(h.get()));
+    ASSERT_NE(copy, nullptr);
+    const char *keys[] = {"n", "s", "list", "map"};
+    for (const char *key : keys) {
+        ASSERT_EQ(serialize_hash_add(copy.get(), key, serialize_int(9)), 0) << key;
+        EXPECT_EQ(serialize_get_int(serialize_hash_get(copy.get(), key)), 9) << key;
+    }
+    serialize_hash_add(copy.get(), "added", serialize_int(10));
+    GvalPtr expected(serialize_hash());
+    for (const char *key : keys) serialize_hash_add(expected.get(), key, serialize_int(9));
+    serialize_hash_add(expected.get(), "added", serialize_int(10));
+    EXPECT_EQ(zaltest::encode(copy.get()), zaltest::encode(expected.get()));
+}
+
 TEST(Value, NestedTreeIsFreedOnceAndDupSharesNothing) {
     GvalPtr h(serialize_hash());
     gval *list = serialize_array();

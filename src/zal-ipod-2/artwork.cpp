@@ -13,6 +13,7 @@
 #include <cstring>
 
 #include "common/log.h"
+#include "common/value_internal.h"
 #include "zal-ipod-2/artwork_state.h"
 #include "zal-ipod-2/command.h"
 #include "zal-ipod-2/packet.h"
@@ -117,19 +118,6 @@ int32_t store_shared(zal_artwork_state &a, const char *path) {
     return 1;
 }
 
-// Detaches the value under key from a decoded hash that is released right after; the
-// hash keeps a null in its place.
-gval *take_hash_value(gval *hash, const char *key) {
-    auto *body = static_cast<gval_hash *>(hash->data);
-    for (int32_t i = 0; i < body->count; ++i) {
-        if (strcmp(body->keys[i], key) != 0) continue;
-        gval *value = body->values[i];
-        body->values[i] = nullptr;
-        return value;
-    }
-    return nullptr;
-}
-
 // Pixels inside the reply: one allocation and one copy in all, the ones that decoding
 // the reply made; the data points into that decoded value, which the record keeps. Only a
 // reply with fewer bytes than height x row stride is copied into a buffer of that size
@@ -143,7 +131,7 @@ int32_t store_inline(zal_artwork_state &a, gval *hash) {
     const std::size_t needed = uint32_t{a.height} * a.rowstride;
     if (count >= needed) {
         a.drop_buffer();  // the mapping, if any, stays mapped for a later shared-file reply
-        a.image_value = take_hash_value(hash, "image");
+        a.image_value = value_hash_take(hash, "image");
         a.data = count > 0 ? bytes : nullptr;
         a.data_capacity = count;
         return 1;

@@ -12,6 +12,7 @@
 #include <cstring>
 
 #include "common/log.h"
+#include "common/value_internal.h"
 #include "zal-ipod-2/command.h"
 #include "zal-ipod-2/devices.h"
 #include "zal-ipod-2/event.h"
@@ -187,20 +188,6 @@ const event_row *event_row_of(const char *type) {
     return at != sorted.rows + kEventTypes && strcmp((*at)->type, type) == 0 ? *at : nullptr;
 }
 
-// Takes the value under key out of a decoded hash, leaving a null in its place (the hash
-// is released right after): the event keeps the decoded data instead of a copy.
-gval *take_hash_value(gval *hash, const char *key) {
-    if (zal_kind(hash) != SERIALIZE_HASH) return nullptr;
-    auto *body = static_cast<gval_hash *>(hash->data);
-    for (int32_t i = 0; i < body->count; ++i) {
-        if (strcmp(body->keys[i], key) != 0) continue;
-        gval *value = body->values[i];
-        body->values[i] = nullptr;
-        return value;
-    }
-    return nullptr;
-}
-
 void process_event(zal_ipod_handle *h, const zal_ipod_reply *r) {
     // The record lives on this stack frame for the callback; only the data is allocated.
     zal_ipod_event event;
@@ -217,7 +204,7 @@ void process_event(zal_ipod_handle *h, const zal_ipod_reply *r) {
         memcpy(event.serial, serial, n);
         event.serial[n] = '\0';
     }
-    event.data = take_hash_value(payload, "data");
+    event.data = value_hash_take(payload, "data");
     if (h->error_message.load() != nullptr) zal_set_error_message(h, nullptr);
     event.kind = row != nullptr ? row->kind : ZALIPOD_EVENT_UNKNOWN;
     if (row != nullptr && row->apply != nullptr) {
@@ -310,8 +297,8 @@ void *callbackThread(void *arg) {
     auto *h = static_cast<zal_ipod_handle *>(arg);
     while (h->loop_stop.load() == 0) {
         zal_ipod_events_iterate(h);
-        for (int waited = 0; waited < kLoopRetryMillis && h->fd.load() < 0 &&
-                             h->loop_stop.load() == 0;
+        for (int waited = 0;
+             waited < kLoopRetryMillis && h->fd.load() < 0 && h->loop_stop.load() == 0;
              waited += kLoopStopCheckMillis)
             usleep(kLoopStopCheckMillis * 1000);
     }
@@ -371,8 +358,7 @@ ZAL_API void zal_ipod_set_event_cb(zal_ipod_handle *h, zal_ipod_event_cb cb, voi
     h->event_cb = cb;
 }
 
-ZAL_API void zal_ipod_set_connection_cb(zal_ipod_handle *h, zal_ipod_connection_cb cb,
-                                        void *user) {
+ZAL_API void zal_ipod_set_connection_cb(zal_ipod_handle *h, zal_ipod_connection_cb cb, void *user) {
     if (h == nullptr) return;
     h->connection_cb_data = user;
     h->connection_cb = cb;
