@@ -26,6 +26,33 @@ Bytes frame(uint16_t tid, uint8_t opcode, const gval *value) {
     return out;
 }
 
+Bytes encode_and_free(gval *value) {
+    uint32_t length = 0;
+    unsigned char *encoded = serialize(value, &length);
+    Bytes out(encoded, encoded + length);
+    free(encoded);
+    serialize_free(value);
+    return out;
+}
+
+zal_ipod_reply reply_of(const Bytes &bytes) {
+    zal_ipod_reply reply{};
+    reply.opcode = ZAL_OP_RETURN;
+    reply.length = static_cast<uint32_t>(bytes.size());
+    reply.payload = const_cast<unsigned char *>(bytes.data());
+    return reply;
+}
+
+void unserialize_and_free(benchmark::State &state, const Bytes &bytes,
+                          int64_t items_per_iteration) {
+    for (auto _ : state) {
+        gval *v = unserialize(bytes.data(), static_cast<uint32_t>(bytes.size()));
+        benchmark::DoNotOptimize(v);
+        serialize_free(v);
+    }
+    state.SetItemsProcessed(static_cast<int64_t>(state.iterations()) * items_per_iteration);
+}
+
 bool read_exact(int fd, unsigned char *p, std::size_t n) {
     std::size_t got = 0;
     while (got < n) {

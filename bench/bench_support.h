@@ -13,6 +13,7 @@
 #include <vector>
 
 #include "zal-ipod-2/serialize.h"
+#include "zal-ipod-2/zal-ipod-2.h"
 
 namespace zalbench {
 
@@ -20,6 +21,16 @@ using Bytes = std::vector<unsigned char>;
 
 // One packet: header with tid and opcode, then the encoded value (none when null).
 Bytes frame(uint16_t tid, uint8_t opcode, const gval *value);
+
+// The encoding of value, which is freed.
+Bytes encode_and_free(gval *value);
+
+// A reply record (opcode RETURN) whose payload is bytes, which must outlive it.
+zal_ipod_reply reply_of(const Bytes &bytes);
+
+// The floor of the decoders' benchmarks: unserialize the bytes and free the value, per
+// iteration; items_per_iteration is reported as the items processed.
+void unserialize_and_free(benchmark::State &state, const Bytes &bytes, int64_t items_per_iteration);
 
 bool read_exact(int fd, unsigned char *p, std::size_t n);
 bool write_all(int fd, const unsigned char *p, std::size_t n);

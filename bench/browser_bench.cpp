@@ -5,12 +5,9 @@
 #include <android/log.h>
 #include <benchmark/benchmark.h>
 
-#include <cstdio>
-#include <cstring>
-#include <map>
 #include <string>
-#include <vector>
 
+#include "bench_support.h"
 #include "zal-ipod-2/browser_state.h"
 #include "zal-ipod-2/handle.h"
 #include "zal-ipod-2/zal-ipod-2.h"
@@ -29,30 +26,21 @@ std::string item_name(int i) {
 }
 
 // The reply: [total, names...].
-std::vector<unsigned char> encoded_reply() {
+zalbench::Bytes encoded_reply() {
     gval *reply = serialize_array_reserve(1 + kNames);
     serialize_array_add(reply, serialize_int(kNames));
     for (int i = 0; i < kNames; ++i)
         serialize_array_add(reply, serialize_string(item_name(i).c_str()));
-    uint32_t length = 0;
-    unsigned char *bytes = serialize(reply, &length);
-    std::vector<unsigned char> out(bytes, bytes + length);
-    free(bytes);
-    serialize_free(reply);
-    return out;
+    return zalbench::encode_and_free(reply);
 }
 
-const std::vector<unsigned char> &reply_bytes() {
-    static const std::vector<unsigned char> bytes = encoded_reply();
+const zalbench::Bytes &reply_bytes() {
+    static const zalbench::Bytes bytes = encoded_reply();
     return bytes;
 }
 
 void cache_and_read(benchmark::State &state) {
-    const auto &bytes = reply_bytes();
-    zal_ipod_reply reply{};
-    reply.opcode = ZAL_OP_RETURN;
-    reply.length = static_cast<uint32_t>(bytes.size());
-    reply.payload = const_cast<unsigned char *>(bytes.data());
+    zal_ipod_reply reply = zalbench::reply_of(reply_bytes());
     auto *h = new zal_ipod_handle();
     for (auto _ : state) {
         if (zal_browser_cache_items(h, &reply, 0) != kNames + 1)
@@ -70,25 +58,8 @@ void cache_and_read(benchmark::State &state) {
 }
 
 void unserialize_only(benchmark::State &state) {
-    const auto &bytes = reply_bytes();
-    for (auto _ : state) {
-        gval *v = unserialize(bytes.data(), static_cast<uint32_t>(bytes.size()));
-        benchmark::DoNotOptimize(v);
-        serialize_free(v);
-    }
-    state.SetItemsProcessed(static_cast<int64_t>(state.iterations()) * kNames);
+    zalbench::unserialize_and_free(state, reply_bytes(), kNames);
 }
-
-class RecordingReporter : public benchmark::ConsoleReporter {
-  public:
-    void ReportRuns(const std::vector<Run> &runs) override {
-        for (const Run &r : runs)
-            if (r.run_type == Run::RT_Iteration && !r.error_occurred)
-                times[r.benchmark_name()] = r.GetAdjustedRealTime();
-        ConsoleReporter::ReportRuns(runs);
-    }
-    std::map<std::string, double> times;
-};
 
 }  // namespace
 
@@ -98,20 +69,12 @@ int main(int argc, char **argv) {
         ->Unit(benchmark::kMicrosecond);
     benchmark::RegisterBenchmark("browser_page/unserialize_only", unserialize_only)
         ->Unit(benchmark::kMicrosecond);
-    benchmark::Initialize(&argc, argv);
-    RecordingReporter reporter;
-    benchmark::RunSpecifiedBenchmarks(&reporter);
-    int missed = 0;
-    auto ours = reporter.times.find("browser_page/cache_and_read_all");
-    auto floor = reporter.times.find("browser_page/unserialize_only");
-    if (ours != reporter.times.end() && floor != reporter.times.end()) {
-        const double ratio = ours->second / floor->second;
-        const bool ok = ratio <= 1.5;
-        printf("\n%-36s %10s %s\n", "comparison", "ratio", "target");
-        printf("%-36s %9.2fx <= 1.5x %s\n", "8000 names cached vs unserialize", ratio,
-               ok ? "ok" : "MISSED");
-        missed = ok ? 0 : 1;
-    }
+    const zalbench::Times times = zalbench::run_benchmarks(&argc, argv);
+    const int missed = zalbench::print_ratios(
+        times,
+        {{"8000 names cached vs unserialize", "browser_page/cache_and_read_all",
+          "browser_page/unserialize_only", false, 1.5}},
+        36);
     benchmark::Shutdown();
     return missed;
 }

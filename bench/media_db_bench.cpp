@@ -18,7 +18,7 @@ namespace {
 constexpr int kTracks = 8000;
 
 // The reply to GET_DB_TRACK_INFO: [count, then eight fields per track].
-std::vector<unsigned char> encoded_reply() {
+zalbench::Bytes encoded_reply() {
     gval *reply = serialize_array_reserve(1 + kTracks * 8);
     serialize_array_add(reply, serialize_int(kTracks));
     for (int i = 0; i < kTracks; ++i) {
@@ -36,25 +36,16 @@ std::vector<unsigned char> encoded_reply() {
             uid[b] = static_cast<unsigned char>((0x5100000000000000ull + i) >> (56 - 8 * b));
         serialize_array_add(reply, serialize_bytes(uid, 8));
     }
-    uint32_t length = 0;
-    unsigned char *bytes = serialize(reply, &length);
-    std::vector<unsigned char> out(bytes, bytes + length);
-    free(bytes);
-    serialize_free(reply);
-    return out;
+    return zalbench::encode_and_free(reply);
 }
 
-const std::vector<unsigned char> &reply_bytes() {
-    static const std::vector<unsigned char> bytes = encoded_reply();
+const zalbench::Bytes &reply_bytes() {
+    static const zalbench::Bytes bytes = encoded_reply();
     return bytes;
 }
 
 void decode_and_read(benchmark::State &state) {
-    const auto &bytes = reply_bytes();
-    zal_ipod_reply reply{};
-    reply.opcode = ZAL_OP_RETURN;
-    reply.length = static_cast<uint32_t>(bytes.size());
-    reply.payload = const_cast<unsigned char *>(bytes.data());
+    zal_ipod_reply reply = zalbench::reply_of(reply_bytes());
     auto *h = new zal_ipod_handle();
     for (auto _ : state) {
         if (zal_db_track_info_decode(h, &reply) != 1) state.SkipWithError("decode failed");
@@ -84,13 +75,7 @@ void decode_and_read(benchmark::State &state) {
 }
 
 void unserialize_only(benchmark::State &state) {
-    const auto &bytes = reply_bytes();
-    for (auto _ : state) {
-        gval *v = unserialize(bytes.data(), static_cast<uint32_t>(bytes.size()));
-        benchmark::DoNotOptimize(v);
-        serialize_free(v);
-    }
-    state.SetItemsProcessed(static_cast<int64_t>(state.iterations()) * kTracks);
+    zalbench::unserialize_and_free(state, reply_bytes(), kTracks);
 }
 
 }  // namespace

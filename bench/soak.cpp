@@ -209,7 +209,8 @@ int main(int argc, char **argv) {
     std::sort(opcodes.begin(), opcodes.end());
     opcodes.erase(std::unique(opcodes.begin(), opcodes.end()), opcodes.end());
     std::ofstream(scenario) << scenario_text(o, opcodes);
-    if (getenv("ZAL_SOAK_SHOW_SCENARIO") != nullptr) fprintf(stderr, "%s", scenario_text(o, opcodes).c_str());
+    if (getenv("ZAL_SOAK_SHOW_SCENARIO") != nullptr)
+        fprintf(stderr, "%s", scenario_text(o, opcodes).c_str());
 
     setenv("ZALD_SIM_SOCKET_PATH", path.c_str(), 1);
     std::vector<std::string> args = {o.sim, "-u", name, "-f", scenario};
@@ -276,7 +277,8 @@ int main(int argc, char **argv) {
             o.clients, seconds, o.seed, totals.calls.load(), totals.calls.load() / seconds,
             totals.longest_ms.load(), kCallBoundSec, totals.slow.load(), totals.events.load(),
             totals.lost.load(), totals.restored.load(), totals.connect_failures.load(), rss_start,
-            rss_end, memory_flat ? "" : "  <- grew", fds_start, fds_end, fds_ok ? "" : "  <- leaked");
+            rss_end, memory_flat ? "" : "  <- grew", fds_start, fds_end,
+            fds_ok ? "" : "  <- leaked");
     const bool ok = totals.slow.load() == 0 && memory_flat && fds_ok && totals.calls.load() > 0 &&
                     WIFEXITED(status) && WEXITSTATUS(status) == 0;
     fprintf(stderr, "soak: %s\n", ok ? "passed" : "FAILED");
