@@ -157,6 +157,23 @@ gval *value_new_hash(uint32_t n, ValueKey *key) {
     return v;
 }
 
+bool value_array_insert_many(gval *a, uint32_t at, gval *const *items, uint32_t n) {
+    gval_array *body = value_array_body(a);
+    const auto count = static_cast<uint32_t>(body->count);
+    const std::uint64_t needed = std::uint64_t{count} + n;
+    int32_t cap =
+        needed > INT32_MAX ? -1 : grown_capacity(body->capacity, static_cast<uint32_t>(needed));
+    if (at > count || cap < 0 || (cap > body->capacity && !grow(&body->items, cap))) {
+        for (uint32_t i = 0; i < n; ++i) serialize_free(items[i]);
+        return false;
+    }
+    body->capacity = cap > body->capacity ? cap : body->capacity;
+    std::memmove(&body->items[at + n], &body->items[at], sizeof(gval *) * (count - at));
+    std::memcpy(&body->items[at], items, sizeof(gval *) * n);
+    body->count += static_cast<int32_t>(n);
+    return true;
+}
+
 bool value_hash_replace(gval *h, int32_t i, gval *value) {
     gval_hash *body = value_hash_body(h);
     if (value_key_in_value_block(body->keys[i])) {

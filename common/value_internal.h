@@ -30,6 +30,10 @@ gval *value_new_blob(uint32_t kind, const void *p, uint32_t n, ValueKey *key = n
 gval *value_new_array(uint32_t n, ValueKey *key);
 gval *value_new_hash(uint32_t n, ValueKey *key);
 
+// Inserts the n items before index at (at <= count) with one move of the tail, taking
+// ownership of them. False when out of memory: the items are freed, the array unchanged.
+bool value_array_insert_many(gval *a, uint32_t at, gval *const *items, uint32_t n);
+
 // Appends (key, value) to a hash known not to hold key; takes ownership of value (freed on
 // failure). Returns the new entry's index, or -1.
 int value_hash_append(gval *h, const char *key, gval *value);

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "common/log.h"
+#include "common/value_internal.h"
 #include "zal-ipod-2/browser_state.h"
 #include "zal-ipod-2/command.h"
 #include "zal-ipod-2/packet.h"
@@ -390,10 +391,15 @@ int32_t zal_browser_cache_items(zal_ipod_handle *h, const zal_ipod_reply *reply,
         serialize_free(v);
         cache = zal_arg_ints({1, 1, offset, 0});
     } else {
+        // [total, names...] becomes [1, 1, offset, n - 1, names...] with one move of the names.
+        gval *header[] = {serialize_int(1), serialize_int(offset), serialize_int(n - 1)};
         serialize_array_set(v, 0, serialize_int(1));
-        serialize_array_insert(v, 1, serialize_int(n - 1));
-        serialize_array_insert(v, 1, serialize_int(offset));
-        serialize_array_insert(v, 1, serialize_int(1));
+        if (header[0] == nullptr || header[1] == nullptr || header[2] == nullptr) {
+            for (gval *item : header)
+                if (item != nullptr) serialize_free(item);
+        } else {
+            value_array_insert_many(v, 1, header, 3);
+        }
     }
     // A failed allocation leaves the array short of its header: the old cache stays.
     if (cache == nullptr || serialize_array_count(cache) != n + 3) {

@@ -5,6 +5,7 @@
 #include <cstring>
 
 #include "common/log.h"
+#include "common/value_internal.h"
 #include "zal-ipod-2/command.h"
 #include "zal-ipod-2/media_db_state.h"
 #include "zal-ipod-2/packet.h"
@@ -252,10 +253,20 @@ ZAL_API int zal_ipod_record_count(zal_ipod_handle *h) {
 // holds a string there, whatever offset and count claim.
 ZAL_API const char *zal_ipod_record(zal_ipod_handle *h, int index) {
     if (h == nullptr) return "";
+    // Read for every name of a page: straight from the array's body.
     const gval *cache = h->records.records;
-    if (cache == nullptr || array_int(cache, 1, 0) == 0) return "";
-    const int64_t offset = array_int(cache, 2, 0);
-    const int64_t count = array_int(cache, 3, 0);
+    if (zal_kind(cache) != SERIALIZE_ARRAY) return "";
+    const gval_array *body = value_array_body(cache);
+    if (body->count < 4) return "";
+    auto header = [body](int32_t i) {
+        const gval *v = body->items[i];
+        int32_t x = 0;
+        if (v != nullptr && v->type == SERIALIZE_INT) std::memcpy(&x, v->data, sizeof x);
+        return x;
+    };
+    if (header(1) == 0) return "";
+    const int64_t offset = header(2);
+    const int64_t count = header(3);
     if (index < offset) {
         printf("Err: offset[%d]<_offset[%d]\n", index, static_cast<int>(offset));
         return "";
@@ -266,9 +277,10 @@ ZAL_API const char *zal_ipod_record(zal_ipod_handle *h, int index) {
         return "";
     }
     const int64_t element = index - offset + 4;
-    if (element >= serialize_array_count(cache)) return "";
-    const gval *name = serialize_array_get(cache, static_cast<uint32_t>(element));
-    return zal_kind(name) == SERIALIZE_STRING ? serialize_get_string(name) : "";
+    if (element >= body->count) return "";
+    const gval *name = body->items[element];
+    return name != nullptr && name->type == SERIALIZE_STRING ? static_cast<const char *>(name->data)
+                                                             : "";
 }
 
 ZAL_API const gval *zal_ipod_get_result_db_track_info(zal_ipod_handle *h) {
