@@ -134,9 +134,9 @@ static int32_t grown_capacity(int32_t capacity, uint32_t n) {
     return cap;
 }
 
-gval *value_new_array(uint32_t n, ValueKey *key) {
-    int32_t cap = grown_capacity(kDefaultCapacity, n);
-    gval_array *body = cap < 0 ? nullptr : serialize_array_new_reserve(static_cast<uint32_t>(cap));
+// An empty array or hash with room for capacity entries; NULL when out of memory.
+static gval *array_of_capacity(uint32_t capacity, ValueKey *key) {
+    gval_array *body = serialize_array_new_reserve(capacity);
     gval *v = new_container(SERIALIZE_ARRAY, body, key);
     if (v == nullptr && body != nullptr) {
         std::free(body->items);
@@ -145,9 +145,8 @@ gval *value_new_array(uint32_t n, ValueKey *key) {
     return v;
 }
 
-gval *value_new_hash(uint32_t n, ValueKey *key) {
-    int32_t cap = grown_capacity(kDefaultCapacity, n);
-    gval_hash *body = cap < 0 ? nullptr : serialize_hash_new_reserve(static_cast<uint32_t>(cap));
+static gval *hash_of_capacity(uint32_t capacity, ValueKey *key) {
+    gval_hash *body = serialize_hash_new_reserve(capacity);
     gval *v = new_container(SERIALIZE_HASH, body, key);
     if (v == nullptr && body != nullptr) {
         std::free(body->keys);
@@ -155,6 +154,16 @@ gval *value_new_hash(uint32_t n, ValueKey *key) {
         std::free(body);
     }
     return v;
+}
+
+gval *value_new_array(uint32_t n, ValueKey *key) {
+    int32_t cap = grown_capacity(kDefaultCapacity, n);
+    return cap < 0 ? nullptr : array_of_capacity(static_cast<uint32_t>(cap), key);
+}
+
+gval *value_new_hash(uint32_t n, ValueKey *key) {
+    int32_t cap = grown_capacity(kDefaultCapacity, n);
+    return cap < 0 ? nullptr : hash_of_capacity(static_cast<uint32_t>(cap), key);
 }
 
 bool value_array_insert_many(gval *a, uint32_t at, gval *const *items, uint32_t n) {
@@ -283,13 +292,7 @@ ZAL_API gval_hash *serialize_hash_new(void) {
 }
 
 ZAL_API gval *serialize_array_reserve(uint32_t n) {
-    gval_array *body = serialize_array_new_reserve(n);
-    gval *v = new_container(SERIALIZE_ARRAY, body);
-    if (v == nullptr && body != nullptr) {
-        std::free(body->items);
-        std::free(body);
-    }
-    return v;
+    return array_of_capacity(n, nullptr);
 }
 
 ZAL_API gval *serialize_array(void) {
@@ -297,14 +300,7 @@ ZAL_API gval *serialize_array(void) {
 }
 
 ZAL_API gval *serialize_hash(void) {
-    gval_hash *body = serialize_hash_new();
-    gval *v = new_container(SERIALIZE_HASH, body);
-    if (v == nullptr && body != nullptr) {
-        std::free(body->keys);
-        std::free(body->values);
-        std::free(body);
-    }
-    return v;
+    return hash_of_capacity(kDefaultCapacity, nullptr);
 }
 
 ZAL_API int serialize_type(const gval *v) {
