@@ -206,6 +206,7 @@ class KeyIndex {
     // Entry index of key, -1 when absent, -2 when out of memory.
     int32_t find(const gval_hash *body, std::string_view key) {
         if (body->count <= kHashScanLimit) {
+            if ((seen_ & mark(key)) == 0) return -1;  // no key of this length and start yet
             for (int32_t i = 0; i < body->count; ++i)
                 if (lengths_[i] == key.size() &&
                     std::memcmp(body->keys[i], key.data(), key.size()) == 0)
@@ -222,8 +223,10 @@ class KeyIndex {
         return it == index_.end() ? -1 : it->second;
     }
 
-    void added(int32_t index, std::size_t length) {
-        if (index >= 0 && index < kHashScanLimit) lengths_[index] = static_cast<uint16_t>(length);
+    void added(int32_t index, std::string_view key) {
+        if (index < 0 || index >= kHashScanLimit) return;
+        lengths_[index] = static_cast<uint16_t>(key.size());
+        seen_ |= mark(key);
     }
 
     // Entry `index` is about to take new_key (equal bytes) in place of its current key,
@@ -237,6 +240,14 @@ class KeyIndex {
     }
 
   private:
+    // One of 64 bits for a key's length and first byte: a small hash's keys almost always
+    // differ in these, so most new keys are known to be new without a scan.
+    static uint64_t mark(std::string_view key) {
+        const unsigned first = key.empty() ? 0u : static_cast<unsigned char>(key[0]);
+        return uint64_t{1} << ((key.size() * 7 + first) & 63);
+    }
+
+    uint64_t seen_ = 0;
     uint16_t lengths_[kHashScanLimit] = {};
     std::unordered_map<std::string_view, int32_t> index_;
     int32_t indexed_ = 0;
@@ -245,9 +256,10 @@ class KeyIndex {
 // Length of a key as kept: at most kMaxKeyLength bytes, ending at a NUL.
 std::size_t key_length_kept(const unsigned char *bytes, uint64_t length) {
     std::size_t n = length > kMaxKeyLength ? kMaxKeyLength : static_cast<std::size_t>(length);
-    for (std::size_t i = 0; i < n; ++i)
-        if (bytes[i] == 0) return i;
-    return n;
+    const void *nul = std::memchr(bytes, 0, n);
+    return nul == nullptr
+               ? n
+               : static_cast<std::size_t>(static_cast<const unsigned char *>(nul) - bytes);
 }
 
 gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed, unsigned depth,
@@ -276,7 +288,8 @@ gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed
         if (value == nullptr) break;
         pos += used;
         gval_hash *body = value_hash_body(hash);
-        int32_t at = keys.find(body, std::string_view(key.stored, key.length));
+        const std::string_view text(key.stored, key.length);
+        int32_t at = keys.find(body, text);
         if (at >= 0) {
             keys.rekey(body, at, key.stored);
             value_hash_replace_inline(hash, at, value, key.stored);
@@ -287,9 +300,15 @@ gval *decode_hash(const unsigned char *p, uint64_t remaining, uint64_t *consumed
             serialize_free(value);
             break;
         }
-        at = value_hash_append_inline(hash, value, key.stored);
-        if (!allocated(at >= 0)) break;
-        keys.added(at, key.length);
+        if (body->count < body->capacity) {  // the usual case: the room was reserved above
+            at = body->count++;
+            body->keys[at] = key.stored;
+            body->values[at] = value;
+        } else {
+            at = value_hash_append_inline(hash, value, key.stored);
+            if (!allocated(at >= 0)) break;
+        }
+        keys.added(at, text);
     }
     *consumed += pos;
     return hash;

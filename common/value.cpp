@@ -22,37 +22,9 @@ bool is_kind(const gval *v, uint32_t kind) {
     return v != nullptr && v->type == kind;
 }
 
-// Offset of a key copied into a value's block: the first address at or after `used` bytes
-// that is 1 modulo 8 (blocks start at multiples of 8).
-std::size_t key_offset(std::size_t used) {
-    return ((used + 6) & ~std::size_t{7}) + 1;
-}
-
-static_assert(alignof(std::max_align_t) >= 8,
-              "keys in value blocks rely on 8-byte malloc alignment");
-
-// Allocates a value record with `used` bytes for the record and its payload, plus room for
-// the key's copy when key is given (then written, and key->stored set).
-gval *allocate_value(std::uint64_t used, ValueKey *key) {
-    if (used > SIZE_MAX - 8) return nullptr;  // also keeps key_offset() from wrapping
-    std::uint64_t total = used;
-    if (key != nullptr)
-        total = key_offset(static_cast<std::size_t>(used)) + std::uint64_t{key->length} + 1;
-    if (total > SIZE_MAX) return nullptr;
-    auto *v = static_cast<gval *>(std::malloc(static_cast<std::size_t>(total)));
-    if (v == nullptr) return nullptr;
-    if (key != nullptr) {
-        char *stored = reinterpret_cast<char *>(v) + key_offset(static_cast<std::size_t>(used));
-        if (key->length > 0) std::memcpy(stored, key->bytes, key->length);
-        stored[key->length] = '\0';
-        key->stored = stored;
-    }
-    return v;
-}
-
 gval *new_container(uint32_t kind, void *body, ValueKey *key = nullptr) {
     if (body == nullptr) return nullptr;
-    gval *v = allocate_value(sizeof(gval), key);
+    gval *v = value_allocate(sizeof(gval), key);
     if (v == nullptr) return nullptr;
     v->type = kind;
     v->data = body;
@@ -90,19 +62,6 @@ bool hash_make_room(gval_hash *body) {
 }
 
 }  // namespace
-
-gval *value_new_blob(uint32_t kind, const void *p, uint32_t n, ValueKey *key) {
-    if (n > 0 && p == nullptr) return nullptr;
-    gval *v = allocate_value(std::uint64_t{sizeof(gval)} + n + 1, key);
-    if (v == nullptr) return nullptr;
-    auto *payload = reinterpret_cast<unsigned char *>(v + 1);
-    v->type = kind;
-    v->data = payload;
-    v->len = n;
-    if (n > 0) std::memcpy(payload, p, n);
-    payload[n] = '\0';  // also for bytes: a stray read as text stops here
-    return v;
-}
 
 static int hash_append(gval *h, char *key, gval *value) {
     gval_hash *body = value_hash_body(h);

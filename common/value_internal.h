@@ -3,6 +3,8 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <cstdlib>
+#include <cstring>
 
 #include "zal-ipod-2/serialize.h"
 
@@ -21,9 +23,48 @@ inline bool value_key_in_value_block(const char *key) {
     return (reinterpret_cast<std::uintptr_t>(key) & 7u) == 1u;
 }
 
+// Offset of a key copied into a value's block: the first address at or after `used` bytes
+// that is 1 modulo 8 (blocks start at multiples of 8).
+inline std::size_t value_key_offset(std::size_t used) {
+    return ((used + 6) & ~std::size_t{7}) + 1;
+}
+
+static_assert(alignof(std::max_align_t) >= 8,
+              "keys in value blocks rely on 8-byte malloc alignment");
+
+// Allocates a value record with `used` bytes for the record and its payload, plus room for
+// the key's copy when key is given (then written, and key->stored set). Inline, as the
+// decoder makes one per value.
+inline gval *value_allocate(std::uint64_t used, ValueKey *key) {
+    if (used > SIZE_MAX - 8) return nullptr;  // also keeps value_key_offset() from wrapping
+    const std::size_t at = key != nullptr ? value_key_offset(static_cast<std::size_t>(used)) : 0;
+    const std::uint64_t total = key != nullptr ? at + std::uint64_t{key->length} + 1 : used;
+    if (total > SIZE_MAX) return nullptr;
+    auto *v = static_cast<gval *>(std::malloc(static_cast<std::size_t>(total)));
+    if (v == nullptr) return nullptr;
+    if (key != nullptr) {
+        char *stored = reinterpret_cast<char *>(v) + at;
+        std::memcpy(stored, key->bytes, key->length);
+        stored[key->length] = '\0';
+        key->stored = stored;
+    }
+    return v;
+}
+
 // A scalar or blob value in one allocation: the record followed by n payload bytes and a
 // NUL, and the key's copy when key is given. p may be null only when n is 0.
-gval *value_new_blob(uint32_t kind, const void *p, uint32_t n, ValueKey *key = nullptr);
+inline gval *value_new_blob(uint32_t kind, const void *p, uint32_t n, ValueKey *key = nullptr) {
+    if (n > 0 && p == nullptr) return nullptr;
+    gval *v = value_allocate(std::uint64_t{sizeof(gval)} + n + 1, key);
+    if (v == nullptr) return nullptr;
+    auto *payload = reinterpret_cast<unsigned char *>(v + 1);
+    v->type = kind;
+    v->data = payload;
+    v->len = n;
+    if (n > 0) std::memcpy(payload, p, n);
+    payload[n] = '\0';  // also for bytes: a stray read as text stops here
+    return v;
+}
 
 // An empty array or hash whose capacity is what doubling from the default reaches for n
 // entries, its record carrying the key's copy when key is given. NULL when out of memory.
