@@ -2,6 +2,8 @@
 //
 // Scalars and blobs live in one heap block (record, payload, NUL). Containers are a
 // record plus a body whose pointer arrays start at capacity 8 and double when full.
+// A hash keeps its own copy of each key; for entries made by the decoder that copy sits in
+// the value's block (see ValueKey), which saves an allocation per entry.
 // Accessors tolerate a null value or one of another kind by returning a neutral result
 // (0, NULL, -1) and changing nothing; the wire decoder never produces such calls, but
 // application code handed a reply it did not expect must not crash on it.
