@@ -3,7 +3,8 @@
 // Scalars and blobs live in one heap block (record, payload, NUL). Containers are a
 // record plus a body whose pointer arrays start at capacity 8 and double when full.
 // A hash keeps its own copy of each key; for entries made by the decoder that copy sits in
-// the value's block (see ValueKey), which saves an allocation per entry.
+// the value's block (see ValueKey), which saves an allocation per entry. Replacing such an
+// entry's value empties the old value but keeps its block for the key.
 // Accessors tolerate a null value or one of another kind by returning a neutral result
 // (0, NULL, -1) and changing nothing; the wire decoder never produces such calls, but
 // application code handed a reply it did not expect must not crash on it.
@@ -34,8 +35,19 @@ gval *new_container(uint32_t kind, void *body, ValueKey *key = nullptr) {
     return v;
 }
 
-void free_key(char *key) {
-    if (!value_key_in_value_block(key)) std::free(key);
+// Releases the storage of an entry's key that value (the entry's value, which stays) does
+// not hold: the hash's own copy, or the emptied block of a value replaced before.
+void release_key(char *key, const gval *value) {
+    if (!value_key_in_value_block(key))
+        std::free(key);
+    else if (void *holder = value_key_holder(key); holder != value)
+        std::free(holder);
+}
+
+// Releases an entry: its key and its value.
+void release_entry(char *key, gval *value) {
+    release_key(key, value);
+    serialize_free(value);
 }
 
 // Grows a pointer array to new_capacity slots; false (array unchanged) on failure.
@@ -68,8 +80,7 @@ bool hash_make_room(gval_hash *body) {
 static int hash_append(gval *h, char *key, gval *value) {
     gval_hash *body = value_hash_body(h);
     if (key == nullptr || !hash_make_room(body)) {
-        free_key(key);
-        serialize_free(value);
+        release_entry(key, value);
         return -1;
     }
     body->keys[body->count] = key;
@@ -144,28 +155,24 @@ bool value_array_insert_many(gval *a, uint32_t at, gval *const *items, uint32_t 
     return true;
 }
 
-bool value_hash_replace(gval *h, int32_t i, gval *value) {
+void value_hash_replace(gval *h, int32_t i, gval *value) {
     gval_hash *body = value_hash_body(h);
-    if (value_key_in_value_block(body->keys[i])) {
-        // The key goes with the old value: the entry needs a copy of its own first.
-        char *copy = strdup(body->keys[i]);
-        if (copy == nullptr) {
-            ZAL_LOGE("serialize_hash_add: no memory for a copy of the key \"%s\"\n", body->keys[i]);
-            serialize_free(value);
-            return false;
-        }
-        body->keys[i] = copy;
+    gval *old = body->values[i];
+    const char *key = body->keys[i];
+    if (value_key_in_value_block(key) && value_key_holder(key) == old) {
+        // The old value's block holds the key: empty it and keep the block for the key.
+        if (old->type == SERIALIZE_ARRAY) serialize_array_destroy(old);
+        if (old->type == SERIALIZE_HASH) serialize_hash_destroy(old);
+    } else {
+        serialize_free(old);
     }
-    serialize_free(body->values[i]);
     body->values[i] = value;
-    return true;
 }
 
 void value_hash_replace_inline(gval *h, int32_t i, gval *value, char *key) {
     gval_hash *body = value_hash_body(h);
-    free_key(body->keys[i]);
+    release_entry(body->keys[i], body->values[i]);
     body->keys[i] = key;
-    serialize_free(body->values[i]);
     body->values[i] = value;
 }
 
@@ -175,7 +182,7 @@ gval *value_hash_take(gval *h, const char *key) {
     for (int32_t i = 0; i < body->count; ++i) {
         if (std::strcmp(body->keys[i], key) != 0) continue;
         gval *value = body->values[i];
-        free_key(body->keys[i]);
+        release_key(body->keys[i], value);
         const auto tail = static_cast<std::size_t>(body->count - i - 1);
         std::memmove(&body->keys[i], &body->keys[i + 1], sizeof(char *) * tail);
         std::memmove(&body->values[i], &body->values[i + 1], sizeof(gval *) * tail);
@@ -405,7 +412,10 @@ ZAL_API int serialize_hash_add(gval *h, const char *key, gval *value) {
     }
     gval_hash *body = value_hash_body(h);
     for (int32_t i = 0; i < body->count; ++i) {
-        if (std::strcmp(body->keys[i], key) == 0) return value_hash_replace(h, i, value) ? 0 : -1;
+        if (std::strcmp(body->keys[i], key) == 0) {
+            value_hash_replace(h, i, value);
+            return 0;
+        }
     }
     return value_hash_append(h, key, value) < 0 ? -1 : 0;
 }
@@ -413,10 +423,7 @@ ZAL_API int serialize_hash_add(gval *h, const char *key, gval *value) {
 ZAL_API void serialize_hash_destroy(gval *h) {
     if (!is_kind(h, SERIALIZE_HASH) || h->data == nullptr) return;
     gval_hash *body = value_hash_body(h);
-    for (int32_t i = 0; i < body->count; ++i) {
-        free_key(body->keys[i]);  // a key in the value's block goes with the value
-        serialize_free(body->values[i]);
-    }
+    for (int32_t i = 0; i < body->count; ++i) release_entry(body->keys[i], body->values[i]);
     std::free(body->keys);
     std::free(body->values);
     std::free(body);

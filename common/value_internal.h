@@ -11,8 +11,10 @@
 // A hash key that the decoder stores in the same heap block as the entry's value, after
 // the value's own bytes. Such a key sits at an address that is 1 modulo 8, where malloc
 // never puts a block, so the hash can tell it from a key copy of its own (strdup) by the
-// address alone: it is released with its value, never on its own. Keys in a value's block
-// only ever belong to the hash entry that holds that value.
+// address alone. The pointer-sized word before it (and the byte between) holds the start of
+// the block, its holder. The holder is the entry's value until that value is replaced:
+// the old value is then emptied but its block stays as the key's holder, so that a key
+// pointer handed out earlier lives as long as the hash, as with a key copy of its own.
 struct ValueKey {
     const char *bytes = nullptr;  // the key's text, length bytes, no NUL inside
     std::size_t length = 0;
@@ -23,20 +25,27 @@ inline bool value_key_in_value_block(const char *key) {
     return (reinterpret_cast<std::uintptr_t>(key) & 7u) == 1u;
 }
 
-// Offset of a key copied into a value's block: the first address at or after `used` bytes
-// that is 1 modulo 8 (blocks start at multiples of 8).
+// The block that holds a key for which value_key_in_value_block() is true.
+inline void *value_key_holder(const char *key) {
+    void *holder = nullptr;
+    std::memcpy(&holder, key - 1 - sizeof holder, sizeof holder);
+    return holder;
+}
+
+// Offset of a key copied into a block whose own bytes take `used`: the first offset past
+// the holder word and one byte that is 1 modulo 8 (blocks start at multiples of 8).
 inline std::size_t value_key_offset(std::size_t used) {
-    return ((used + 6) & ~std::size_t{7}) + 1;
+    return ((used + sizeof(void *) + 1 + 6) & ~std::size_t{7}) + 1;
 }
 
 static_assert(alignof(std::max_align_t) >= 8,
               "keys in value blocks rely on 8-byte malloc alignment");
 
 // Allocates a value record with `used` bytes for the record and its payload, plus room for
-// the key's copy when key is given (then written, and key->stored set). Inline, as the
-// decoder makes one per value.
+// the key's copy when key is given (then written with its holder word, and key->stored
+// set). Inline, as the decoder makes one per value.
 inline gval *value_allocate(std::uint64_t used, ValueKey *key) {
-    if (used > SIZE_MAX - 8) return nullptr;  // also keeps value_key_offset() from wrapping
+    if (used > SIZE_MAX - 32) return nullptr;  // also keeps value_key_offset() from wrapping
     const std::size_t at = key != nullptr ? value_key_offset(static_cast<std::size_t>(used)) : 0;
     const std::uint64_t total = key != nullptr ? at + std::uint64_t{key->length} + 1 : used;
     if (total > SIZE_MAX) return nullptr;
@@ -44,6 +53,8 @@ inline gval *value_allocate(std::uint64_t used, ValueKey *key) {
     if (v == nullptr) return nullptr;
     if (key != nullptr) {
         char *stored = reinterpret_cast<char *>(v) + at;
+        void *holder = v;
+        std::memcpy(stored - 1 - sizeof holder, &holder, sizeof holder);
         std::memcpy(stored, key->bytes, key->length);
         stored[key->length] = '\0';
         key->stored = stored;
@@ -82,10 +93,9 @@ int value_hash_append(gval *h, const char *key, gval *value);
 // Same, for a value that carries its key in its block (key is that ValueKey's stored).
 int value_hash_append_inline(gval *h, gval *value, char *key);
 
-// Replaces the value of entry i, freeing the old one; the entry keeps its key (copied
-// first when it lived in the old value's block). False, with value freed and the entry
-// unchanged, when that copy cannot be made.
-bool value_hash_replace(gval *h, int32_t i, gval *value);
+// Replaces the value of entry i, freeing the old one; the entry keeps its key (when the
+// old value's block holds it, that block stays, emptied, as the key's holder).
+void value_hash_replace(gval *h, int32_t i, gval *value);
 
 // Same, for a value that carries an equal key in its block: the entry takes that key.
 void value_hash_replace_inline(gval *h, int32_t i, gval *value, char *key);

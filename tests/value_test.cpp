@@ -139,10 +139,16 @@ TEST(Hash, DecodedHashesStayEditable) {
     GvalPtr copy(serialize_dup(h.get()));
     ASSERT_NE(copy, nullptr);
     const char *keys[] = {"n", "s", "list", "map"};
-    for (const char *key : keys) {
-        ASSERT_EQ(serialize_hash_add(copy.get(), key, serialize_int(9)), 0) << key;
-        EXPECT_EQ(serialize_get_int(serialize_hash_get(copy.get(), key)), 9) << key;
+    // Key pointers read before the replacements stay valid as long as the hash.
+    const char *held[4];
+    for (int i = 0; i < 4; ++i) held[i] = serialize_hash_get_key(copy.get(), i);
+    for (int round = 0; round < 2; ++round) {
+        for (int i = 0; i < 4; ++i) {
+            ASSERT_EQ(serialize_hash_add(copy.get(), held[i], serialize_int(9)), 0) << keys[i];
+            EXPECT_EQ(serialize_get_int(serialize_hash_get(copy.get(), keys[i])), 9) << keys[i];
+        }
     }
+    for (int i = 0; i < 4; ++i) EXPECT_STREQ(held[i], keys[i]);
     serialize_hash_add(copy.get(), "added", serialize_int(10));
     GvalPtr expected(serialize_hash());
     for (const char *key : keys) serialize_hash_add(expected.get(), key, serialize_int(9));
