@@ -121,8 +121,9 @@ bool allocated(bool ok) {
 
 // key, when given, is the hash key under which the value is stored; it is copied into the
 // value's own block (see ValueKey).
-gval *decode_scalar(uint32_t kind, const unsigned char *p, uint64_t remaining, uint64_t *consumed,
-                    ValueKey *key) {
+[[gnu::always_inline]] inline gval *decode_scalar(uint32_t kind, const unsigned char *p,
+                                                  uint64_t remaining, uint64_t *consumed,
+                                                  ValueKey *key) {
     if (remaining < 5) return nullptr;
     uint32_t bits = get_be32(p + 1);  // big-endian on the wire
     gval *v = allocated(value_new_blob(kind, &bits, 4, key));
@@ -130,8 +131,9 @@ gval *decode_scalar(uint32_t kind, const unsigned char *p, uint64_t remaining, u
     return v;
 }
 
-gval *decode_blob(uint32_t kind, const unsigned char *p, uint64_t remaining, uint64_t *consumed,
-                  ValueKey *key) {
+[[gnu::always_inline]] inline gval *decode_blob(uint32_t kind, const unsigned char *p,
+                                                uint64_t remaining, uint64_t *consumed,
+                                                ValueKey *key) {
     if (remaining < 4) return nullptr;
     uint32_t n = get_be32(p);
     if (n > remaining - 4) return nullptr;
@@ -206,7 +208,8 @@ class KeyIndex {
     // Entry index of key, -1 when absent, -2 when out of memory.
     int32_t find(const gval_hash *body, std::string_view key) {
         if (body->count <= kHashScanLimit) {
-            if ((seen_ & mark(key)) == 0) return -1;  // no key of this length and start yet
+            last_mark_ = mark(key);
+            if ((seen_ & last_mark_) == 0) return -1;  // no key of this length and start yet
             for (int32_t i = 0; i < body->count; ++i)
                 if (lengths_[i] == key.size() &&
                     std::memcmp(body->keys[i], key.data(), key.size()) == 0)
@@ -223,10 +226,11 @@ class KeyIndex {
         return it == index_.end() ? -1 : it->second;
     }
 
+    // Entry `index` was just added with key, the last one find() was asked about.
     void added(int32_t index, std::string_view key) {
         if (index < 0 || index >= kHashScanLimit) return;
         lengths_[index] = static_cast<uint16_t>(key.size());
-        seen_ |= mark(key);
+        seen_ |= last_mark_;
     }
 
     // Entry `index` is about to take new_key (equal bytes) in place of its current key,
@@ -248,6 +252,7 @@ class KeyIndex {
     }
 
     uint64_t seen_ = 0;
+    uint64_t last_mark_ = 0;
     uint16_t lengths_[kHashScanLimit] = {};
     std::unordered_map<std::string_view, int32_t> index_;
     int32_t indexed_ = 0;

@@ -220,8 +220,9 @@ ZAL_API gval *serialize_struct(const void *p, uint32_t n) {
 
 ZAL_API gval_array *serialize_array_new_reserve(uint32_t n) {
     if (n > INT32_MAX) return nullptr;
-    auto *body = static_cast<gval_array *>(std::calloc(1, sizeof(gval_array)));
+    auto *body = static_cast<gval_array *>(std::malloc(sizeof(gval_array)));
     if (body == nullptr) return nullptr;
+    *body = gval_array{};
     if (n > 0) {
         body->items = static_cast<gval **>(std::malloc(sizeof(gval *) * n));
         if (body->items == nullptr) {
@@ -239,8 +240,9 @@ ZAL_API gval_array *serialize_array_new(void) {
 
 ZAL_API gval_hash *serialize_hash_new_reserve(uint32_t n) {
     if (n > INT32_MAX) return nullptr;
-    auto *body = static_cast<gval_hash *>(std::calloc(1, sizeof(gval_hash)));
+    auto *body = static_cast<gval_hash *>(std::malloc(sizeof(gval_hash)));
     if (body == nullptr) return nullptr;
+    *body = gval_hash{};
     if (n > 0) {
         body->keys = static_cast<char **>(std::malloc(sizeof(char *) * n));
         body->values = static_cast<gval **>(std::malloc(sizeof(gval *) * n));
