@@ -91,7 +91,7 @@ void set_integer(Call &c) {
 }
 
 // Flags of the current track, answered under the key the query names.
-template <bool Track::*flag, const char *key>
+template <auto flag, const char *key>  // flag: a bool member of Track or of its tags
 void track_flag(Call &c) {
     Device *d = c.require_session();
     if (d == nullptr) return;

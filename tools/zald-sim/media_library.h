@@ -39,8 +39,9 @@ int32_t collection_type_of(int32_t category);
 // Category of a collection type (0 play list, 1 artist, 2 album, 4 genre, 5 composer), -1.
 int32_t category_of_collection_type(int32_t type);
 
-struct LibraryTrack {
-    uint64_t uid = 0;
+// What a track is called and how long it plays: the part that play-queue tracks and library
+// records share.
+struct TrackTags {
     std::string title;
     std::string artist;
     std::string album;
@@ -48,6 +49,10 @@ struct LibraryTrack {
     std::string composer;
     int32_t length_ms = 180000;
     bool audiobook = false;
+};
+
+struct LibraryTrack : TrackTags {
+    uint64_t uid = 0;
     bool podcast = false;
     bool itunes_u = false;
 };

@@ -146,16 +146,21 @@ std::string item_place(const std::string &place, size_t index) {
     return place + "/" + std::to_string(index);
 }
 
+// The keys of a play-queue track and of a library track alike.
+void read_tags(Reader &r, TrackTags *t) {
+    t->title = r.required_text("title");
+    t->artist = r.text("artist", "Unknown Artist");
+    t->album = r.text("album", "Unknown Album");
+    t->genre = r.text("genre", "");
+    t->composer = r.text("composer", "");
+    t->length_ms = static_cast<int32_t>(r.integer("length_ms", 180000, 1, INT32_MAX));
+    t->audiobook = r.flag("audiobook", false);
+}
+
 Track read_track(const Source &src, const json &j, const std::string &place) {
     Reader r(src, j, place);
     Track t;
-    t.title = r.required_text("title");
-    t.artist = r.text("artist", "Unknown Artist");
-    t.album = r.text("album", "Unknown Album");
-    t.genre = r.text("genre", "");
-    t.composer = r.text("composer", "");
-    t.length_ms = static_cast<int32_t>(r.integer("length_ms", 180000, 1, INT32_MAX));
-    t.audiobook = r.flag("audiobook", false);
+    read_tags(r, &t);
     t.video = r.flag("video", false);
     t.sample_rate = static_cast<int32_t>(r.integer("sample_rate", 44100, 8000, 192000));
     t.uid = static_cast<uint64_t>(r.integer("uid", 0, 1, INT64_MAX));
@@ -197,13 +202,7 @@ Track read_track(const Source &src, const json &j, const std::string &place) {
 LibraryTrack read_library_track(const Source &src, const json &j, const std::string &place) {
     Reader r(src, j, place);
     LibraryTrack t;
-    t.title = r.required_text("title");
-    t.artist = r.text("artist", "Unknown Artist");
-    t.album = r.text("album", "Unknown Album");
-    t.genre = r.text("genre", "");
-    t.composer = r.text("composer", "");
-    t.length_ms = static_cast<int32_t>(r.integer("length_ms", 180000, 1, INT32_MAX));
-    t.audiobook = r.flag("audiobook", false);
+    read_tags(r, &t);
     t.podcast = r.flag("podcast", false);
     t.itunes_u = r.flag("itunes_u", false);
     r.finish();

@@ -13,14 +13,8 @@ namespace sim {
 
 LibraryTrack library_track_of(const Track &t) {
     LibraryTrack lt;
+    static_cast<TrackTags &>(lt) = t;
     lt.uid = t.uid;
-    lt.title = t.title;
-    lt.artist = t.artist;
-    lt.album = t.album;
-    lt.genre = t.genre;
-    lt.composer = t.composer;
-    lt.length_ms = t.length_ms;
-    lt.audiobook = t.audiobook;
     return lt;
 }
 

@@ -35,14 +35,7 @@ struct Chapter {
     int32_t length_ms = 60000;
 };
 
-struct Track {
-    std::string title;
-    std::string artist;
-    std::string album;
-    std::string genre;
-    std::string composer;
-    int32_t length_ms = 180000;
-    bool audiobook = false;
+struct Track : TrackTags {
     bool video = false;
     int32_t sample_rate = 44100;
     uint64_t uid = 0;               // persistent identifier; 0: derived from the track's place
