@@ -10,6 +10,7 @@
 
 #include "e2e_fixture.h"
 #include "sim_fixture.h"
+#include "zalctl_fixture.h"
 
 namespace zaltest {
 namespace {
@@ -39,14 +40,8 @@ std::string shown(const std::vector<std::string> &args, const ProgramResult &r) 
            r.err;
 }
 
-class ZalctlBrowseTest : public EndToEndTest {
+class ZalctlBrowseTest : public ZalctlSuite {
   protected:
-    void SetUp() override {
-#ifndef ZALCTL_PATH
-        GTEST_SKIP() << "zalctl is not built";
-#endif
-        EndToEndTest::SetUp();
-    }
     // The JSON listing of a path.
     Json listing(std::vector<std::string> args) {
         args.insert(args.begin(), {"--json", "browse"});
